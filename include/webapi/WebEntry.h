@@ -1,0 +1,78 @@
+#ifndef WEBAPI_WEBENTRY_H
+#define WEBAPI_WEBENTRY_H
+
+#include <json/json.h>
+
+#include <string>
+
+#include "webapi/APIExport.h"
+#include "webapi/APIRunner.h"
+
+struct TALOCGI;
+
+namespace TALO {
+
+/// The CGI front: made once per HTTP request and driven with one call. It reads
+/// the CGI environment and the parameters, dispatches the request, writes header
+/// block and body to standard output, and runs the response's callbacks in a
+/// detached process.
+///
+///     int main(int argc, char** argv) {
+///         TALO::WebEntry entry;
+///         entry.SetArgs(argc, argv);
+///         entry.Run(Json::Value());
+///         return 0;
+///     }
+///
+/// The working directory is expected to be the web API directory. Nothing throws.
+class WEBAPI_EXPORT WebEntry : public APIRunner {
+  public:
+    /// The largest body of a request that is no upload; a longer one is 101
+    /// before anything is allocated. It bounds the memory that one client takes.
+    static constexpr long long kMaxBodyBytes = 16LL << 20;
+
+    WebEntry();
+    ~WebEntry();
+
+    /// Serves the request. The argument is not used. The result is that of
+    /// HandleCallback.
+    int Run(const Json::Value& args) override;
+    int Initialize(const Json::Value& args) override;
+    bool NeedPermission(APIRequest* request) override;
+    bool CheckPermission(APIRequest* request, APIResponse* response) override;
+    bool HandleUpload(APIRequest* request, APIResponse* response) override;
+    bool SkipPermission(APIRequest* request) override;
+
+    /// Read the parameters into "getParam" and "postParam" of a document.
+    bool InitParam(Json::Value& document);
+    bool InitGetParam(Json::Value& getParam);
+    bool InitPostParam(Json::Value& postParam);
+
+    /// Splits and decodes one parameter line into an object, carriers of
+    /// enciphered parameters included.
+    bool DetectAndDecryptParamLine(const std::string& line, Json::Value& params);
+    bool DecryptParam(const std::string& text, Json::Value& params);
+    bool DecryptAESParam(Json::Value& params);
+
+    /// Forwards the request to the appliance that "relay_nd" names.
+    bool ProcessRelay(APIRequest* request, APIResponse* response);
+
+    /// Write to standard output.
+    void OutputHeader();
+    void OutputBody();
+
+    /// Runs the callbacks in a child. 0 when there are none, else the child's id,
+    /// negative when it could not be started.
+    int HandleCallback(APIResponse* response);
+
+  private:
+    void AdoptSessionParameter();
+
+    Json::Value uploadFiles;
+    TALOCGI* cgiContext;
+    Json::Value permissionCache;
+};
+
+}  // namespace TALO
+
+#endif

@@ -1,0 +1,110 @@
+#include <cstdio>
+#include <cstdlib>
+#include <memory>
+#include <vector>
+
+#include "platform/Cgi.h"
+#include "platform/WebAPIUtil.h"
+#include "src/base/ErrorCode.h"
+#include "src/base/JsonConvert.h"
+#include "src/request/APIRequestPrivate.h"
+#include "src/request/Carriers.h"
+#include "webapi/APIRequest.h"
+#include "webapi/APIResponse.h"
+#include "webapi/WebEntry.h"
+
+namespace TALO {
+
+namespace {
+
+bool NamesAPI(const Json::Value& params) {
+    return FindMember(&params, "api") != nullptr && FindMember(&params, "version") != nullptr &&
+           FindMember(&params, "method") != nullptr;
+}
+
+struct Free {
+    void operator()(char* memory) const {
+        std::free(memory);
+    }
+};
+
+}  // namespace
+
+bool WebEntry::InitParam(Json::Value& document) {
+    if (request->HasEnv("QUERY_STRING") && !InitGetParam(document["getParam"])) {
+        return false;
+    }
+    if (request->GetRequestMethod() != kMethodPost) {
+        return true;
+    }
+    if (request->IsUploadRequest()) {
+        // The body of an upload is read later; the query has to say whose it is.
+        if (NamesAPI(Member(document, "getParam"))) {
+            return true;
+        }
+    } else if (InitPostParam(document["postParam"])) {
+        return true;
+    }
+    response->SetError(kErrorBadRequest, Json::Value());
+    return false;
+}
+
+bool WebEntry::InitGetParam(Json::Value& getParam) {
+    const Json::Value line = request->GetEnv("QUERY_STRING", Json::Value());
+    if (!line.isString()) {
+        response->SetError(kErrorBadRequest, Json::Value());
+        return false;
+    }
+    return DetectAndDecryptParamLine(line.asString(), getParam);
+}
+
+bool WebEntry::InitPostParam(Json::Value& postParam) {
+    if (postParam.isNull()) {
+        postParam = Json::Value(Json::objectValue);
+    }
+    if (!postParam.isObject() || request->IsUploadRequest()) {
+        return false;
+    }
+    const long long length = ToInt64(request->GetEnv("CONTENT_LENGTH", 0), 0);
+    if (length <= 0 || length > kMaxBodyBytes) {
+        return false;
+    }
+    // calloc hands out untouched pages: a client that promises much and sends
+    // little costs little.
+    const size_t size = static_cast<size_t>(length);
+    const std::unique_ptr<char, Free> body(static_cast<char*>(std::calloc(size + 1, 1)));
+    if (body == nullptr) {
+        return false;
+    }
+    (void)std::fread(body.get(), 1, size, stdin);
+    return DetectAndDecryptParamLine(body.get(), postParam);
+}
+
+bool WebEntry::DetectAndDecryptParamLine(const std::string& line, Json::Value& params) {
+    std::vector<char> copy(line.c_str(), line.c_str() + line.size() + 1);
+    if (TaloCgiDetectAndDecryptParamLine(copy.data()) == 0 ||
+        !WebAPIUtil::strPairToJsonObj(copy.data(), params, true, true)) {
+        return false;
+    }
+    if (!params.empty() && !DecryptAESParam(params)) {
+        return false;
+    }
+    Json::Value* nested = NestedObject(params);
+    std::string text;
+    if (nested != nullptr && TakeCarrier(*nested, kCipherText, &text) != Carrier::kAbsent) {
+        (void)DecryptParam(text, *nested);
+        (void)TakeCarrier(*nested, kCipherToken, nullptr);
+    }
+    return true;
+}
+
+// No cipher is on board: what a carrier held is missing.
+bool WebEntry::DecryptParam(const std::string&, Json::Value&) {
+    return false;
+}
+
+bool WebEntry::DecryptAESParam(Json::Value& params) {
+    return DecryptAESCarriers(params);
+}
+
+}  // namespace TALO

@@ -1,0 +1,32 @@
+#ifndef TALO_SRC_RESPONSE_APIRESPONSEPRIVATE_H
+#define TALO_SRC_RESPONSE_APIRESPONSEPRIVATE_H
+
+#include <string>
+
+#include "webapi/APIBase.h"
+#include "webapi/APIResponse.h"
+
+namespace ORB {
+class Task;
+}
+
+namespace TALO {
+
+class APIResponsePrivate : public APIBase {
+  public:
+    APIResponsePrivate(APIRequest* request, APIResponse* owner);
+    virtual ~APIResponsePrivate();
+
+    void SetError(int code, const Json::Value& details);
+    void SetCallbackFunc(APIResponse::CallbackFunc function, void* argument);
+
+    APIRequest* request;
+    APIResponse* owner;
+    ORB::Task* task = nullptr;
+    int error = 0;
+    APIResponse::CallbackList callbacks;
+};
+
+}  // namespace TALO
+
+#endif

@@ -1,0 +1,176 @@
+#include <errno.h>
+#include <glob.h>
+
+#include "platform/System.h"
+#include "platform/WebAPIUtil.h"
+#include "src/base/JsonConvert.h"
+#include "src/base/Log.h"
+#include "src/runner/APIRunnerPrivate.h"
+#include "webapi/APIRequest.h"
+#include "webapi/APIRunner.h"
+
+namespace TALO {
+
+namespace {
+
+constexpr int kMaxCandidates = 4;
+constexpr int kLowestPriority = -10;
+constexpr int kHighestPriority = 10;
+
+// A name becomes a part of a file's name, so it may hold nothing that leads out
+// of the folder of descriptions.
+bool IsAPIName(const std::string& api) {
+    constexpr char kAlphanumeric[] =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789";
+    constexpr char kAllowed[] =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789._-";
+    return api.find_first_of(kAlphanumeric) == 0 &&
+           api.find_first_not_of(kAllowed) == std::string::npos;
+}
+
+// The file that holds an API: of the prefixes that end before the second to the
+// fifth dot (or with the name), the longest that exists. "" when none does.
+std::string FindDescriptionFile(const std::string& api) {
+    std::string chosen;
+    size_t dot = api.find('.');
+    for (int candidate = 0; candidate < kMaxCandidates; ++candidate) {
+        dot = dot == std::string::npos ? dot : api.find('.', dot + 1);
+        const std::string file = api.substr(0, dot) + ".lib";
+        if (TLIBCFileExist(file.c_str()) == 1) {
+            chosen = file;
+        }
+        if (dot == std::string::npos) {
+            break;
+        }
+    }
+    return chosen;
+}
+
+void AddDescriptions(const APIRunner& runner, Json::Value& file, Json::Value& descs) {
+    if (!file.isObject()) {
+        return;
+    }
+    for (auto member = file.begin(); member != file.end(); ++member) {
+        if (runner.CheckLibDescription(*member)) {
+            descs[member.name()] = runner.ApplyLibDef(*member);
+        } else {
+            LOG_ERROR("WebAPI description %s is not valid.", member.name().c_str());
+        }
+    }
+}
+
+}  // namespace
+
+int APIRunner::InitLibDesc(Json::Value& descs, const std::string& api) {
+    if (api.empty()) {
+        return 0;
+    }
+    if (FindMember(&descs, api) != nullptr) {
+        return 1;
+    }
+    const std::string file = IsAPIName(api) ? FindDescriptionFile(api) : std::string();
+    if (file.empty()) {
+        LOG_ERROR("WebAPI %s is not valid", api.c_str());
+        return 0;
+    }
+    Json::Value content;
+    errno = 0;
+    if (!WebAPIUtil::ReadJsonFile(content, file.c_str())) {
+        LOG_ERROR("WebAPI description file %s is not valid", file.c_str());
+        return 0;
+    }
+    AddDescriptions(*this, content, descs);
+    return 1;
+}
+
+int APIRunner::InitLibDesc(Json::Value& descs, APIRequest* request) {
+    return request != nullptr ? InitLibDesc(descs, request->GetAPIClass()) : 0;
+}
+
+int APIRunner::InitLibDesc(Json::Value& descs) {
+    glob_t files = {};
+    if (glob("*.lib", 0, nullptr, &files) != 0) {
+        globfree(&files);
+        return 0;
+    }
+    for (size_t index = 0; index < files.gl_pathc; ++index) {
+        Json::Value content;
+        if (WebAPIUtil::ReadJsonFile(content, files.gl_pathv[index])) {
+            AddDescriptions(*this, content, descs);
+        }
+    }
+    globfree(&files);
+    return 1;
+}
+
+// An empty "lib" passes: it fails when the library is opened.
+int APIRunner::CheckLibDescription(const Json::Value& desc) const {
+    if (!Member(desc, "lib").isString() || !Member(desc, "minVersion").isInt() ||
+        !Member(desc, "maxVersion").isInt() || !Member(desc, "methods").isObject()) {
+        return 0;
+    }
+    const Json::Value* priority = FindMember(&desc, "priority");
+    if (priority == nullptr) {
+        return 1;
+    }
+    return priority->isInt() && priority->asInt() <= kHighestPriority &&
+                   priority->asInt() >= kLowestPriority
+               ? 1
+               : 0;
+}
+
+Json::Value& APIRunner::ApplyLibDef(Json::Value& desc) const {
+    const auto fill = [&desc](const char* key, const Json::Value& value) {
+        if (FindMember(&desc, key) == nullptr) {
+            desc[key] = value;
+        }
+    };
+    fill("authLevel", Member(libDef, "authLevel"));
+    fill("allowUser", Member(libDef, "allowUser"));
+    fill("requestFormat", "JSON");
+    fill("priority", Member(libDef, "priority"));
+    return desc;
+}
+
+Json::Value& APIRunner::GetMethod(const std::string& api, int version, const std::string& method) {
+    const Json::Value* attributes = nullptr;
+    if (InitLibDesc(libDesc, api)) {
+        const Json::Value& methods = Member(Member(libDesc, api), "methods");
+        const Json::Value& entries = Member(methods, std::to_string(version));
+        for (Json::ArrayIndex index = 0; entries.isArray() && index < entries.size(); ++index) {
+            // Only an entry's first member counts here, although any member of it
+            // lists a method: a second one has the default attributes.
+            const Json::Value& entry = entries[index];
+            if (entry.isObject() && !entry.empty() && entry.begin().name() == method) {
+                attributes = &*entry.begin();
+                break;
+            }
+        }
+    }
+    if (attributes == nullptr) {
+        attributes = FindMember(&libDef, "methods");
+    }
+    if (attributes == nullptr) {
+        static Json::Value none;
+        none = Json::Value();
+        return none;
+    }
+    return const_cast<Json::Value&>(*attributes);
+}
+
+bool APIRunner::GetMethodAttr(const std::string& api, int version, const std::string& method,
+                              const std::string& attr) {
+    const Json::Value& attributes = GetMethod(api, version, method);
+    const Json::Value& source = attributes.isObject() ? attributes : Member(libDef, "methods");
+    return ToBool(Member(source, attr));
+}
+
+bool APIRunner::GetMethodAttr(APIRequest* request, const std::string& attr) {
+    if (request == nullptr || attr.empty()) {
+        return false;
+    }
+    return GetMethodAttr(request->GetAPIClass(), request->GetAPIVersion(), request->GetAPIMethod(),
+                         attr);
+}
+
+}  // namespace TALO

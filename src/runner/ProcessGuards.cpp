@@ -1,0 +1,47 @@
+#include "src/runner/ProcessGuards.h"
+
+#include <sys/resource.h>
+
+#include <iostream>
+
+namespace TALO {
+
+// The streams are closed again before the method runs: their buffers stay in
+// place, and every use of them fails.
+StandardStreams::StandardStreams(bool disconnectInput, bool disconnectOutput) {
+    if (disconnectInput) {
+        noInput.open("/dev/null");
+        input = std::cin.rdbuf(noInput.rdbuf());
+        noInput.close();
+    }
+    if (disconnectOutput) {
+        noOutput.open("/dev/null", std::ios::out | std::ios::trunc);
+        output = std::cout.rdbuf(noOutput.rdbuf());
+        noOutput.close();
+    }
+}
+
+// Putting a buffer back clears the error state that the method's use has left.
+StandardStreams::~StandardStreams() {
+    if (input != nullptr) {
+        std::cin.rdbuf(input);
+    }
+    if (output != nullptr) {
+        std::cout.rdbuf(output);
+    }
+}
+
+SchedulingPriority::SchedulingPriority(int priority)
+    : before(getpriority(PRIO_PROCESS, 0)), changed(priority != before) {
+    if (changed) {
+        (void)setpriority(PRIO_PROCESS, 0, priority);
+    }
+}
+
+SchedulingPriority::~SchedulingPriority() {
+    if (changed) {
+        (void)setpriority(PRIO_PROCESS, 0, before);
+    }
+}
+
+}  // namespace TALO

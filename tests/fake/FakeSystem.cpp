@@ -1,0 +1,82 @@
+#include <errno.h>
+#include <fcntl.h>
+#include <string.h>
+#include <unistd.h>
+
+#include "platform/System.h"
+#include "tests/fake/FakePlatform.h"
+
+namespace {
+
+int Folder(const std::map<std::string, std::string>& folders, const char* name, char* buffer,
+           size_t size) {
+    const auto found = folders.find(name);
+    if (found == folders.end() || found->second.size() >= size) {
+        return -1;
+    }
+    memcpy(buffer, found->second.c_str(), found->second.size() + 1);
+    return 0;
+}
+
+}  // namespace
+
+extern "C" {
+
+int TLIBCProcFork(void) {
+    if (fake::Now().Called("TLIBCProcFork")) {
+        errno = EAGAIN;
+        return -1;
+    }
+    const pid_t child = fork();
+    if (child == 0) {
+        const int nowhere = open("/dev/null", O_RDWR);
+        for (int descriptor = 0; descriptor <= 2; ++descriptor) {
+            (void)dup2(nowhere, descriptor);
+        }
+        if (nowhere > 2) {
+            (void)close(nowhere);
+        }
+    }
+    return child;
+}
+
+int TLIBCFileExist(const char* path) {
+    return !fake::Now().Called("TLIBCFileExist") && fake::Now().files.count(path) ? 1 : 0;
+}
+
+int TLIBCSysUnlink(const char* path) {
+    fake::Now().unlinked.push_back(path);
+    if (fake::Now().Called("TLIBCSysUnlink") || fake::Now().files.erase(path) == 0) {
+        errno = ENOENT;
+        return -1;
+    }
+    return 0;
+}
+
+int TLIBGroupIsAdminGroupMem(const char* user, int) {
+    if (fake::Now().Called("TLIBGroupIsAdminGroupMem")) {
+        return -1;
+    }
+    return fake::Now().administrators.count(user) ? 1 : 0;
+}
+
+int TALOUserPreferenceDirGet(const char* user, char* buffer, size_t size) {
+    if (fake::Now().Called("TALOUserPreferenceDirGet")) {
+        return -1;
+    }
+    return Folder(fake::Now().userPreference, user, buffer, size);
+}
+
+int TALOGroupPreferenceDirGet(const char* group, char* buffer, size_t size) {
+    if (fake::Now().Called("TALOGroupPreferenceDirGet")) {
+        return -1;
+    }
+    return Folder(fake::Now().groupPreference, group, buffer, size);
+}
+
+int TLIBNetService(int service, int action, int flags) {
+    fake::Now().services.push_back({service, action, flags});
+    return fake::Now().Called("TLIBNetService") ? -1 : 0;
+}
+
+}  // extern "C"
