@@ -1,0 +1,12 @@
+#ifndef BENCH_GROUPS_H
+#define BENCH_GROUPS_H
+
+namespace bench {
+
+void JsonText();      // the serialiser against the library's writers
+void Requests();      // parameter lines, description look-up, a call in-process
+void ProcessStart();  // a whole entry.cgi process against a bare program
+
+}  // namespace bench
+
+#endif

@@ -1,0 +1,40 @@
+#include <cstdio>
+#include <cstring>
+
+#include "Groups.h"
+
+namespace {
+
+struct Group {
+    const char* name;
+    void (*run)();
+};
+
+const Group kGroups[] = {
+    {"json", bench::JsonText},
+    {"requests", bench::Requests},
+    {"process", bench::ProcessStart},
+};
+
+bool Wanted(const char* name, int argc, char** argv) {
+    for (int word = 1; word < argc; ++word) {
+        if (std::strcmp(argv[word], name) == 0) {
+            return true;
+        }
+    }
+    return argc == 1;
+}
+
+}  // namespace
+
+// The groups to run are named on the command line; all without.
+int main(int argc, char** argv) {
+    std::printf(
+        "Medians of one interleaved run; the last column is the ratio to the first row.\n\n");
+    for (const Group& group : kGroups) {
+        if (Wanted(group.name, argc, argv)) {
+            group.run();
+        }
+    }
+    return 0;
+}
