@@ -43,7 +43,8 @@ class TALO_PLATFORM WebAPIUtil {
     // `decode` percent-decodes names and values once (a plus is a blank). With
     // `parseJson` a value that is one complete, strict JSON value at most
     // kMaxJsonDepth deep is stored as that value, and a line that is itself one
-    // JSON object adds its members; all else is stored as text. Empty pieces and
+    // JSON object adds its members; all else is stored as text, and so is what goes
+    // beyond a port's bound on the JSON values of one line. Empty pieces and
     // pairs with an empty name add nothing; a piece without "=" is a name with an
     // empty text. False for more than kMaxPairs pairs or when `out` is something
     // else than an object or null.

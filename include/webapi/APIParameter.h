@@ -13,7 +13,7 @@ template <typename T>
 class APIParameterPrivate;
 
 /// Whether a parameter must be there. Any value but REQUIRED counts as optional.
-enum PARAM_NECESSITY { REQUIRED = 0, OPTIONAL = 1 };
+enum PARAM_NECESSITY : int { REQUIRED = 0, OPTIONAL = 1 };
 
 /// A request parameter as a typed value that knows how it came about: absent,
 /// missing though required, sent as JSON null, valid, or bad (wrong type, out of

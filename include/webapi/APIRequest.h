@@ -34,7 +34,7 @@ class APIRequestPrivate;
 class WEBAPI_EXPORT APIRequest {
   public:
     /// Whether a parameter must be there. Any value but REQUIRED counts as optional.
-    enum PARAM_NECESSITY { REQUIRED = 0, OPTIONAL = 1 };
+    enum PARAM_NECESSITY : int { REQUIRED = 0, OPTIONAL = 1 };
 
     /// Builds a request from an environment document, an object with the optional
     /// members "environ", "getParam", "postParam", "reqLib" and "session". Any
@@ -100,8 +100,8 @@ class WEBAPI_EXPORT APIRequest {
     int GetTimeoutDuration() const;  ///< minutes
     std::string GetApplication() const;
     std::string GetSessionFilePath() const;
-    std::string GetUILanguage() const;                ///< "enu" when unknown
-    bool HasAppPriv(const std::string& name) const;   ///< exactly this application
+    std::string GetUILanguage() const;               ///< "enu" when unknown
+    bool HasAppPriv(const std::string& name) const;  ///< exactly this application
     bool IsAuthorized() const;
     bool IsTimeout() const;
     bool IsSkipCheckIP() const;

@@ -77,7 +77,7 @@ class WEBAPI_EXPORT APIRunner {
     int InitEnv(Json::Value& environ);
 
     /// The result document with the member "httpd_restart" added.
-    Json::Value GetResponse() const;
+    Json::Value GetResponse();
 
     /// Runs one method in-process as `user`, without any permission check, and
     /// leaves its result document in `out`. Null `api`, `method` or `user`: 101.
@@ -92,8 +92,8 @@ class WEBAPI_EXPORT APIRunner {
     int InitLibDesc(Json::Value& descs, const std::string& api);
     int InitLibDesc(Json::Value& descs, APIRequest* request);
     int InitLibDesc(Json::Value& descs);
-    int CheckLibDescription(const Json::Value& desc) const;
-    Json::Value& ApplyLibDef(Json::Value& desc) const;
+    int CheckLibDescription(Json::Value& desc);
+    Json::Value& ApplyLibDef(Json::Value& desc);
 
     /// The attributes of a method, or the site's defaults. The reference lives
     /// until the next call of this operation.

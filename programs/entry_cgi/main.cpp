@@ -1,5 +1,7 @@
 #include <fcntl.h>
+#include <poll.h>
 #include <signal.h>
+#include <time.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -32,6 +34,33 @@ void ForgetTaskIdentity() {
     }
 }
 
+long MillisecondsNow() {
+    struct timespec now = {};
+    (void)clock_gettime(CLOCK_MONOTONIC, &now);
+    return now.tv_sec * 1000 + now.tv_nsec / 1000000;
+}
+
+// Takes what is left of a body that nobody asked for: some servers lose the
+// reply of a program that ends before it has read its input. Never waits for a
+// client that sends nothing, and for one that dawdles no longer than a moment.
+void DiscardInput() {
+    constexpr long kMostBytes = 64L << 20;
+    constexpr long kMostMilliseconds = 1000;
+    static char discarded[64 * 1024];
+    struct pollfd input = {STDIN_FILENO, POLLIN, 0};
+    const long end = MillisecondsNow() + kMostMilliseconds;
+    long total = 0;
+    for (long left = 0;
+         total < kMostBytes && left >= 0 && poll(&input, 1, static_cast<int>(left)) > 0;
+         left = end - MillisecondsNow()) {
+        const ssize_t count = read(STDIN_FILENO, discarded, sizeof discarded);
+        if (count <= 0) {
+            return;
+        }
+        total += count;
+    }
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -45,5 +74,6 @@ int main(int argc, char** argv) {
     TALO::WebEntry entry;
     entry.SetArgs(argc, argv);
     (void)entry.Run(Json::Value());
+    DiscardInput();
     return 0;
 }

@@ -2,10 +2,9 @@
 
 #include <getopt.h>
 
-#include <fstream>
-#include <iostream>
-#include <iterator>
-#include <memory>
+#include <cstdio>
+
+#include "platform/WebAPIUtil.h"
 
 namespace {
 
@@ -14,41 +13,44 @@ bool Fail(std::string* problem, const std::string& text) {
     return false;
 }
 
-bool ParseStrict(const std::string& text, Json::Value* out) {
-    Json::CharReaderBuilder builder;
-    Json::CharReaderBuilder::strictMode(&builder.settings_);
-    builder["strictRoot"] = false;
-    const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
-    Json::Value value;
-    try {
-        if (!reader->parse(text.data(), text.data() + text.size(), &value, nullptr)) {
-            return false;
-        }
-    } catch (const Json::Exception&) {  // nested too deep
+// A value by the rules of a web request's parameters: JSON where it is JSON, else text.
+Json::Value ParseValue(const std::string& text) {
+    Json::Value pair(Json::objectValue);
+    (void)TALO::WebAPIUtil::strPairToJsonObj("value=" + TALO::WebAPIUtil::URLEncode(text), pair,
+                                             true, true);
+    return pair["value"];
+}
+
+bool ParseObject(const std::string& text, Json::Value* out) {
+    const Json::Value value = ParseValue(text);
+    if (!value.isObject()) {
         return false;
     }
     *out = value;
     return true;
 }
 
+bool ReadAll(FILE* file, std::string* text) {
+    char block[4096];
+    size_t got = 0;
+    while ((got = fread(block, 1, sizeof block, file)) > 0) {
+        text->append(block, got);
+    }
+    return ferror(file) == 0;
+}
+
 // "-" is standard input.
 bool ReadObject(const std::string& path, Json::Value* out, std::string* problem) {
+    FILE* file = path == "-" ? stdin : fopen(path.c_str(), "re");
     std::string text;
-    if (path == "-") {
-        text.assign(std::istreambuf_iterator<char>(std::cin), {});
-    } else {
-        std::ifstream file(path);
-        if (!file) {
-            return Fail(problem, "cannot read " + path);
-        }
-        text.assign(std::istreambuf_iterator<char>(file), {});
+    const bool complete = file != nullptr && ReadAll(file, &text);
+    if (file != nullptr && file != stdin) {
+        (void)fclose(file);
     }
-    Json::Value value;
-    if (!ParseStrict(text, &value) || !value.isObject()) {
-        return Fail(problem, path + " is not a JSON object");
+    if (!complete) {
+        return Fail(problem, "cannot read " + path);
     }
-    *out = value;
-    return true;
+    return ParseObject(text, out) || Fail(problem, path + " is not a JSON object");
 }
 
 // "name=value": the value is JSON where it parses as JSON, else text.
@@ -58,11 +60,7 @@ bool AddParameter(const std::string& word, Arguments* arguments, std::string* pr
         return Fail(problem, "expected name=value, got \"" + word + "\"");
     }
     const std::string name = word.substr(0, equals);
-    const std::string text = word.substr(equals + 1);
-    Json::Value value;
-    if (!ParseStrict(text, &value)) {
-        value = text;
-    }
+    const Json::Value value = ParseValue(word.substr(equals + 1));
     if (name != "version") {
         arguments->params[name] = value;
         return true;
@@ -87,7 +85,7 @@ bool ParseOptions(int argc, char** argv, Arguments* arguments, std::string* prob
                 arguments->user = optarg;
                 break;
             case 'a':
-                if (!ParseStrict(optarg, &arguments->attrs) || !arguments->attrs.isObject()) {
+                if (!ParseObject(optarg, &arguments->attrs)) {
                     return Fail(problem, "--attrs is not a JSON object");
                 }
                 break;

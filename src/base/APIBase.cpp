@@ -20,11 +20,14 @@ bool APIBase::SetData(const std::string& section, const Json::Value& members, bo
     if (!target.isObject()) {
         return false;
     }
+    // Merged aside: `members` may be a part of what the merge replaces.
+    Json::Value merged = target;
     for (auto member = members.begin(); member != members.end(); ++member) {
         if (!stringOnly || member->isString()) {
-            target[member.name()] = *member;
+            merged[member.name()] = *member;
         }
     }
+    target.swap(merged);
     return true;
 }
 
@@ -60,11 +63,11 @@ bool APIBase::ClearData(const std::string& section, const std::string& key) {
         target.clear();
         return true;
     }
-    if (FindMember(&target, key) == nullptr) {
+    if (!target.isObject()) {
         return false;
     }
-    target.removeMember(key);
-    return true;
+    // With both ends, or a name would end at its first zero byte.
+    return target.removeMember(key.data(), key.data() + key.size(), nullptr);
 }
 
 }  // namespace TALO

@@ -3,8 +3,9 @@
 namespace TALO {
 
 const ErrorCodeRow kErrorCodes[] = {
-    {kErrorBadRequest, "bad request: environment or parameters unreadable, API name or method "
-                       "missing, version below 1, or a relay parameter where relay is not allowed"},
+    {kErrorBadRequest,
+     "bad request: environment or parameters unreadable, API name or method "
+     "missing, version below 1, or a relay parameter where relay is not allowed"},
     {kErrorNoSuchAPI, "no description for the API"},
     {kErrorNoSuchMethod, "method not listed for that version"},
     {kErrorVersion, "version out of the API's range"},
@@ -13,8 +14,9 @@ const ErrorCodeRow kErrorCodes[] = {
     {kErrorSessionRefused, "session refused"},
     {kErrorUpload, "upload could not be read"},
     {kErrorRelay, "relay failed, or a relay parameter in a call that cannot be relayed"},
-    {kErrorCompoundOrFork, "compound request without a usable list, or a background task could "
-                           "not be started"},
+    {kErrorCompoundOrFork,
+     "compound request without a usable list, or a background task could "
+     "not be started"},
     {kErrorLibrary, "API library cannot be opened or has no method table"},
     {kErrorCompoundSkipped, "compound element skipped after a failure"},
     {kErrorCompoundTransfer, "compound element whose method allows upload or download"},

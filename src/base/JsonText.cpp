@@ -199,9 +199,17 @@ void AppendValue(Output& out, const Json::Value& value);
 
 void AppendArray(Output& out, const Json::Value& array) {
     char before = '[';
-    for (const Json::Value& element : array) {
+    Json::ArrayIndex next = 0;
+    const auto end = array.end();
+    for (auto element = array.begin(); element != end; ++element, ++next) {
+        // The library keeps no element for an index that an assignment skipped.
+        for (; next < element.index(); ++next) {
+            out.Append(before);
+            out.Append("null", 4);
+            before = ',';
+        }
         out.Append(before);
-        AppendValue(out, element);
+        AppendValue(out, *element);
         before = ',';
     }
     out.Append(before == '[' ? "[]" : "]", before == '[' ? 2 : 1);

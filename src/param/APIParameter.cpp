@@ -101,8 +101,8 @@ template <typename T>
 APIParameter<T>::APIParameter() : d(new APIParameterPrivate<T>()) {}
 
 template <typename T>
-APIParameter<T>::APIParameter(const APIParameter& other) : d(new APIParameterPrivate<T>(*other.d)) {
-}
+APIParameter<T>::APIParameter(const APIParameter& other)
+    : d(new APIParameterPrivate<T>(*other.d)) {}
 
 template <typename T>
 APIParameter<T>& APIParameter<T>::operator=(const APIParameter& other) {

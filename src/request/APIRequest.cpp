@@ -55,15 +55,12 @@ void APIRequest::InitEnv(const Json::Value& environ) {
 }
 
 void APIRequest::InitParam(const Json::Value& document, bool clear) {
+    // Copied before anything changes: the document may be a part of the parameters.
+    Json::Value sources[] = {Member(document, "getParam"), Member(document, "postParam")};
     if (clear) {
         d->ClearData("param", "");
     }
-    for (const char* source : {"getParam", "postParam"}) {
-        const Json::Value* member = FindMember(&document, source);
-        if (member == nullptr) {
-            continue;
-        }
-        Json::Value params = *member;
+    for (Json::Value& params : sources) {
         (void)d->DecryptParam(params);
         d->SetData("param", params, false);
         d->SetAPIDesc(params);

@@ -9,11 +9,11 @@ namespace TALO {
 
 // The parameters that carry enciphered ones. The mixed case keeps them apart
 // from any parameter that an API would name.
-extern const char kCipherText[];     // a line under the appliance's own cipher
-extern const char kCipherToken[];    // goes with it inside a nested "webapi" object
-extern const char kAESText[];        // a line under the key of a token
-extern const char kAESToken[];       // that token
-extern const char kNestedObject[];   // the parameters of an inner request
+extern const char kCipherText[];    // a line under the appliance's own cipher
+extern const char kCipherToken[];   // goes with it inside a nested "webapi" object
+extern const char kAESText[];       // a line under the key of a token
+extern const char kAESToken[];      // that token
+extern const char kNestedObject[];  // the parameters of an inner request
 
 enum class Carrier { kAbsent, kText, kUnreadable };
 

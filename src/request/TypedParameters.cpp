@@ -13,8 +13,7 @@ APIParameter<bool> APIRequest::GetAndCheckBool(const std::string& name, PARAM_NE
     return d->GetAndCheckParam<bool>(name, necessity == REQUIRED, Json::booleanValue, validator);
 }
 
-APIParameter<double> APIRequest::GetAndCheckReal(const std::string& name,
-                                                 PARAM_NECESSITY necessity,
+APIParameter<double> APIRequest::GetAndCheckReal(const std::string& name, PARAM_NECESSITY necessity,
                                                  APIParameter<double>::Validator validator) const {
     return d->GetAndCheckParam<double>(name, necessity == REQUIRED, Json::realValue, validator);
 }

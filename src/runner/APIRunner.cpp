@@ -115,7 +115,7 @@ int APIRunner::InitEnv(Json::Value& environment) {
     return 1;
 }
 
-Json::Value APIRunner::GetResponse() const {
+Json::Value APIRunner::GetResponse() {
     if (response == nullptr) {
         return Json::Value();
     }

@@ -82,9 +82,9 @@ int APIRunner::HandleCompound(APIRequest* request, APIResponse* response) {
     for (const Json::Value& params : list) {
         Json::Value document(Json::objectValue);
         document["postParam"] = params;
-        const bool readable =
-            params.isObject() &&
-            Guarded(kSource, __LINE__, [&] { element->InitParam(document, true); });
+        const bool readable = params.isObject() && Guarded(kSource, __LINE__, [&] {
+                                  element->InitParam(document, true);
+                              });
         if (stopWhenError && failed) {
             answer->SetError(kErrorCompoundSkipped, Json::Value());
         } else if (!readable) {

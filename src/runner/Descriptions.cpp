@@ -22,8 +22,7 @@ constexpr int kHighestPriority = 10;
 bool IsAPIName(const std::string& api) {
     constexpr char kAlphanumeric[] =
         "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789";
-    constexpr char kAllowed[] =
-        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789._-";
+    constexpr char kAllowed[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789._-";
     return api.find_first_of(kAlphanumeric) == 0 &&
            api.find_first_not_of(kAllowed) == std::string::npos;
 }
@@ -46,7 +45,7 @@ std::string FindDescriptionFile(const std::string& api) {
     return chosen;
 }
 
-void AddDescriptions(const APIRunner& runner, Json::Value& file, Json::Value& descs) {
+void AddDescriptions(APIRunner& runner, Json::Value& file, Json::Value& descs) {
     if (!file.isObject()) {
         return;
     }
@@ -65,10 +64,13 @@ int APIRunner::InitLibDesc(Json::Value& descs, const std::string& api) {
     if (api.empty()) {
         return 0;
     }
-    if (FindMember(&descs, api) != nullptr) {
+    // The name is judged first: whether a description file that happens to be
+    // loaded has a member of an impossible name must not matter.
+    const bool possible = IsAPIName(api);
+    if (possible && FindMember(&descs, api) != nullptr) {
         return 1;
     }
-    const std::string file = IsAPIName(api) ? FindDescriptionFile(api) : std::string();
+    const std::string file = possible ? FindDescriptionFile(api) : std::string();
     if (file.empty()) {
         LOG_ERROR("WebAPI %s is not valid", api.c_str());
         return 0;
@@ -104,7 +106,7 @@ int APIRunner::InitLibDesc(Json::Value& descs) {
 }
 
 // An empty "lib" passes: it fails when the library is opened.
-int APIRunner::CheckLibDescription(const Json::Value& desc) const {
+int APIRunner::CheckLibDescription(Json::Value& desc) {
     if (!Member(desc, "lib").isString() || !Member(desc, "minVersion").isInt() ||
         !Member(desc, "maxVersion").isInt() || !Member(desc, "methods").isObject()) {
         return 0;
@@ -119,7 +121,7 @@ int APIRunner::CheckLibDescription(const Json::Value& desc) const {
                : 0;
 }
 
-Json::Value& APIRunner::ApplyLibDef(Json::Value& desc) const {
+Json::Value& APIRunner::ApplyLibDef(Json::Value& desc) {
     const auto fill = [&desc](const char* key, const Json::Value& value) {
         if (FindMember(&desc, key) == nullptr) {
             desc[key] = value;

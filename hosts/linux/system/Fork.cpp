@@ -6,7 +6,9 @@
 namespace {
 
 void DetachStandardDescriptors() {
-    const int nowhere = open("/dev/null", O_RDWR | O_CLOEXEC);
+    // Not close-on-exec: where a standard descriptor was closed, this one takes
+    // its place and has to outlive an exec.
+    const int nowhere = open("/dev/null", O_RDWR);
     for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
         if (nowhere < 0) {
             (void)close(descriptor);

@@ -22,8 +22,7 @@ int FolderBelow(const char* parent, const char* name, char* buffer, size_t size)
     const int length = snprintf(path, sizeof path, "%s%s", parent, name);
     struct stat facts = {};
     if (length < 0 || static_cast<size_t>(length) >= sizeof path ||
-        static_cast<size_t>(length) >= size || stat(path, &facts) != 0 ||
-        !S_ISDIR(facts.st_mode)) {
+        static_cast<size_t>(length) >= size || stat(path, &facts) != 0 || !S_ISDIR(facts.st_mode)) {
         return -1;
     }
     memcpy(buffer, path, static_cast<size_t>(length) + 1);

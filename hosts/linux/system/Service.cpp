@@ -1,4 +1,5 @@
 #include <errno.h>
+#include <signal.h>
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -10,6 +11,23 @@
 namespace {
 
 constexpr char kSource[] = "Service.cpp";
+
+// Starts a program with the signals that we ignore back at their defaults.
+int Spawn(pid_t* child, char* const arguments[]) {
+    posix_spawnattr_t attributes;
+    const int error = posix_spawnattr_init(&attributes);
+    if (error != 0) {
+        return error;
+    }
+    sigset_t ignored;
+    (void)sigemptyset(&ignored);
+    (void)sigaddset(&ignored, SIGPIPE);
+    (void)posix_spawnattr_setsigdefault(&attributes, &ignored);
+    (void)posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGDEF);
+    const int result = posix_spawn(child, arguments[0], nullptr, &attributes, arguments, environ);
+    (void)posix_spawnattr_destroy(&attributes);
+    return result;
+}
 
 int WaitFor(pid_t child) {
     int status = 0;
@@ -35,7 +53,7 @@ extern "C" int TLIBNetService(int service, int action, int) {
     char actionName[] = "restart";
     char* const arguments[] = {program, serviceName, actionName, nullptr};
     pid_t child = -1;
-    const int error = posix_spawn(&child, program, nullptr, nullptr, arguments, environ);
+    const int error = Spawn(&child, arguments);
     if (error != 0) {
         errno = error;
         HOST_LOG("cannot run %s: %m", program);

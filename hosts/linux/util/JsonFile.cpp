@@ -85,8 +85,8 @@ bool ReadJsonFile(Json::Value& out, const char* path, std::string* reason) {
     }
     Json::Value value;
     JsonError error;
-    if (!ParseJson(content.data(), content.data() + content.size(),
-                   TALO::WebAPIUtil::kMaxJsonDepth, &value, &error)) {
+    if (!ParseJson(content.data(), content.data() + content.size(), TALO::WebAPIUtil::kMaxJsonDepth,
+                   &value, &error)) {
         return Refuse(reason,
                       std::string(error.reason) + " at byte " + std::to_string(error.offset));
     }

@@ -20,8 +20,12 @@ bool IsHexDigit(char byte) {
 // where the walk stopped.
 class Walk {
   public:
-    Walk(const char* begin, const char* end, size_t maxDepth)
-        : begin_(begin), at_(begin), end_(end), maxDepth_(maxDepth < kSlots ? maxDepth : kSlots) {}
+    Walk(const char* begin, const char* end, size_t maxDepth, size_t maxValues)
+        : begin_(begin),
+          at_(begin),
+          end_(end),
+          maxDepth_(maxDepth < kSlots ? maxDepth : kSlots),
+          maxValues_(maxValues) {}
 
     bool Document() {
         SkipSpace();
@@ -33,6 +37,10 @@ class Walk {
         }
         SkipSpace();
         return at_ == end_ || Fail("text behind the value");
+    }
+
+    size_t Values() const {
+        return values_;
     }
 
     JsonError Error() const {
@@ -60,7 +68,7 @@ class Walk {
     // One value, or the opening of a container, and all that closes behind it.
     // `more` says whether another value has to follow.
     bool Value(bool* more) {
-        if (++values_ > kMaxJsonValues) {
+        if (++values_ > maxValues_) {
             return Fail("too many values");
         }
         if (At('[') || At('{')) {
@@ -183,10 +191,10 @@ class Walk {
             return Fail("unknown escape");
         }
         for (int digits = *at_ == 'u' ? 4 : 0; digits > 0; --digits) {
-            if (at_ + 1 == end_ || !IsHexDigit(at_[1])) {
+            ++at_;
+            if (at_ == end_ || !IsHexDigit(*at_)) {
                 return Fail("unknown escape");
             }
-            ++at_;
         }
         return true;
     }
@@ -230,6 +238,7 @@ class Walk {
     const char* at_;
     const char* end_;
     size_t maxDepth_;
+    size_t maxValues_;
     size_t depth_ = 0;
     size_t values_ = 0;
     const char* reason_ = "";
@@ -251,18 +260,22 @@ Json::CharReader& Reader() {
 
 }  // namespace
 
-bool AcceptJson(const char* begin, const char* end, size_t maxDepth, JsonError* error) {
-    Walk walk(begin, end, maxDepth);
-    if (walk.Document()) {
-        return true;
+bool AcceptJson(const char* begin, const char* end, size_t maxDepth, JsonError* error,
+                size_t* budget) {
+    Walk walk(begin, end, maxDepth, budget != nullptr ? *budget : kMaxJsonValues);
+    if (!walk.Document()) {
+        *error = walk.Error();
+        return false;
     }
-    *error = walk.Error();
-    return false;
+    if (budget != nullptr) {
+        *budget -= walk.Values();
+    }
+    return true;
 }
 
 bool ParseJson(const char* begin, const char* end, size_t maxDepth, Json::Value* out,
-               JsonError* error) {
-    if (!AcceptJson(begin, end, maxDepth, error)) {
+               JsonError* error, size_t* budget) {
+    if (!AcceptJson(begin, end, maxDepth, error, budget)) {
         return false;
     }
     Json::Value value;

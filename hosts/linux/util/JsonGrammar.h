@@ -20,12 +20,15 @@ constexpr size_t kMaxJsonValues = 500000;
 // Whether the text is exactly one JSON value, white space around it allowed:
 // the strict grammar, no comments, no NUL, at most `maxDepth` arrays and objects
 // within each other. Needs no memory and no recursion, whatever the text.
-bool AcceptJson(const char* begin, const char* end, size_t maxDepth, JsonError* error);
+// Several texts may share a `budget` of values instead of the limit above: what
+// an accepted one takes goes off it.
+bool AcceptJson(const char* begin, const char* end, size_t maxDepth, JsonError* error,
+                size_t* budget = nullptr);
 
 // Parses what AcceptJson accepts. The library's own reader is laxer and
 // recurses, so the grammar is checked first. `out` stays untouched on failure.
 bool ParseJson(const char* begin, const char* end, size_t maxDepth, Json::Value* out,
-               JsonError* error);
+               JsonError* error, size_t* budget = nullptr);
 
 }  // namespace host
 

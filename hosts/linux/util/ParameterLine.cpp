@@ -21,16 +21,17 @@ std::string Trimmed(const std::string& text) {
                : text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
-bool ParseText(const std::string& text, Json::Value* out) {
+bool ParseText(const std::string& text, Json::Value* out, size_t* budget) {
     JsonError error;
-    return ParseJson(text.data(), text.data() + text.size(), kMaxDepth, out, &error);
+    return ParseJson(text.data(), text.data() + text.size(), kMaxDepth, out, &error, budget);
 }
 
 // A line that is one JSON object: its members. `merged` says whether it was.
 bool MergeObject(const std::string& line, Json::Value& out, bool* merged) {
     Json::Value object;
     const size_t first = line.find_first_not_of(" \t\r\n");
-    *merged = first != std::string::npos && line[first] == '{' && ParseText(line, &object);
+    size_t budget = kMaxJsonValues;
+    *merged = first != std::string::npos && line[first] == '{' && ParseText(line, &object, &budget);
     if (!*merged) {
         return true;
     }
@@ -43,7 +44,10 @@ bool MergeObject(const std::string& line, Json::Value& out, bool* merged) {
     return true;
 }
 
-void MergePair(const std::string& piece, Json::Value& out, bool decode, bool parseJson) {
+// `budget` bounds the JSON values of the whole line: ten thousand pairs of a
+// thousand values each would cost as much memory as one pair of ten million.
+void MergePair(const std::string& piece, Json::Value& out, bool decode, bool parseJson,
+               size_t* budget) {
     const size_t equals = piece.find('=');
     std::string name = piece.substr(0, equals);
     std::string value = equals == std::string::npos ? std::string() : piece.substr(equals + 1);
@@ -55,7 +59,7 @@ void MergePair(const std::string& piece, Json::Value& out, bool decode, bool par
         return;
     }
     Json::Value parsed;
-    if (parseJson && ParseText(value, &parsed)) {
+    if (parseJson && ParseText(value, &parsed, budget)) {
         out[name].swap(parsed);
     } else {
         out[name] = value;
@@ -86,18 +90,20 @@ bool MergeParameterLine(const std::string& line, Json::Value& out, bool decode, 
     }
     if (parseJson) {
         bool merged = false;
-        if (!MergeObject(line, out, &merged) || merged) {
-            return merged;
+        const bool withinLimit = MergeObject(line, out, &merged);
+        if (merged) {
+            return withinLimit;
         }
     }
     size_t pairs = 0;
+    size_t budget = kMaxJsonValues;
     for (size_t start = 0; start < line.size();) {
         const size_t end = std::min(line.find('&', start), line.size());
         if (end > start) {
             if (++pairs > kMaxPairs) {
                 return false;
             }
-            MergePair(line.substr(start, end - start), out, decode, parseJson);
+            MergePair(line.substr(start, end - start), out, decode, parseJson, &budget);
         }
         start = end + 1;
     }
