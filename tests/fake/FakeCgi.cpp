@@ -30,6 +30,7 @@ void TaloCgiFree(TALOCGI* ctx) {
     if (ctx == nullptr) {
         return;
     }
+    fake::Now().journal.push_back("TaloCgiFree");
     if (ctx->state != nullptr) {
         --fake::Now().openContexts;
     }

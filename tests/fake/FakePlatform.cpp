@@ -23,6 +23,7 @@ void Platform::WriteJson(const std::string& path, const Json::Value& document) {
 }
 
 bool Platform::Called(const std::string& operation) {
+    journal.push_back(operation);
     const int number = ++calls[operation];
     const auto planned = failAt.find(operation);
     return planned != failAt.end() && planned->second == number;

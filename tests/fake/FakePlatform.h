@@ -20,16 +20,18 @@ struct ServiceCall {
 };
 
 struct Platform {
-    std::map<std::string, std::string> files;             // path to content
-    std::set<std::string> administrators;                 // user names
-    std::map<std::string, std::string> userPreference;    // user to folder
-    std::map<std::string, std::string> groupPreference;   // group to folder
-    std::string decipheredLine;  // what TaloCgiDetectAndDecryptParamLine leaves, "" for the line itself
+    std::map<std::string, std::string> files;            // path to content
+    std::set<std::string> administrators;                // user names
+    std::map<std::string, std::string> userPreference;   // user to folder
+    std::map<std::string, std::string> groupPreference;  // group to folder
+    std::string
+        decipheredLine;  // what TaloCgiDetectAndDecryptParamLine leaves, "" for the line itself
 
-    std::vector<ServiceCall> services;      // calls of TLIBNetService
-    std::vector<std::string> unlinked;      // paths given to TLIBCSysUnlink
-    std::vector<std::string> cookiesRead;   // HTTP_COOKIE at each TaloCgiLoadInCookies
-    int openContexts = 0;                   // TaloCgiInit less TaloCgiFree
+    std::vector<ServiceCall> services;     // calls of TLIBNetService
+    std::vector<std::string> unlinked;     // paths given to TLIBCSysUnlink
+    std::vector<std::string> cookiesRead;  // HTTP_COOKIE at each TaloCgiLoadInCookies
+    int openContexts = 0;                  // TaloCgiInit less TaloCgiFree
+    std::vector<std::string> journal;      // every operation by name, in order
 
     std::map<std::string, int> calls;   // operation to number of calls
     std::map<std::string, int> failAt;  // operation to the call that fails, counted from 1
