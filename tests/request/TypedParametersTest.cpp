@@ -8,7 +8,6 @@
 #include "webapi/APIRequest.h"
 
 using support::Parse;
-using TALO::APIParameter;
 using TALO::APIRequest;
 
 namespace {

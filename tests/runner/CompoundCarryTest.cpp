@@ -8,7 +8,6 @@
 
 namespace {
 
-using runner::Parse;
 using TALO::APIResponse;
 
 // What an element's response hands to the reply as a whole.

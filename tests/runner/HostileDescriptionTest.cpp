@@ -4,7 +4,6 @@
 namespace {
 
 using runner::Description;
-using runner::Parse;
 
 class HostileDescription : public runner::Fixture {
   protected:

@@ -5,7 +5,6 @@
 namespace {
 
 using runner::Error;
-using runner::Parse;
 
 // The order of the dispatch.
 class Process : public runner::Fixture {

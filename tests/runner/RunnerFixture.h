@@ -21,7 +21,7 @@ using support::Parse;
 
 // A runner that shows its fields and whose hooks a test writes. `trace` notes
 // which hook was asked, in order.
-class OpenRunner : public TALO::APIRunner {
+class OpenRunner final : public TALO::APIRunner {
   public:
     using TALO::APIRunner::compoundDepth;
     using TALO::APIRunner::d;

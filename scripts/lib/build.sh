@@ -1,0 +1,22 @@
+# shellcheck shell=bash
+# Configuring and building by preset. Needs common.sh.
+# shellcheck disable=SC2154  # project is set by common.sh
+
+# The folder of a preset's build: build_folder PRESET
+build_folder() {
+    echo "$project/build/$1"
+}
+
+# configure_and_build PRESET [ARGUMENT OF cmake --build]...
+configure_and_build() {
+    local preset=$1
+    shift
+    if command -v ccache >/dev/null; then
+        export CMAKE_CXX_COMPILER_LAUNCHER=ccache
+    fi
+    quietly "$project/build/$preset.configure.log" \
+        cmake -S "$project" --preset "$preset" || die "preset $preset cannot be configured"
+    quietly "$project/build/$preset.build.log" \
+        cmake --build "$(build_folder "$preset")" --parallel "$(nproc)" "$@" ||
+        die "preset $preset cannot be built"
+}

@@ -1,0 +1,89 @@
+# shellcheck shell=bash
+# The steps of scripts/check, each a function that works in the project's folder
+# and fails with a message. Needs common.sh and build.sh.
+# shellcheck disable=SC2154  # project is set by common.sh
+
+# The files of the project, the ones not yet committed included: sources PATTERN...
+sources() {
+    local file
+    git -c safe.directory="$project" ls-files -z --cached --others --exclude-standard -- "$@" |
+        while IFS= read -r -d '' file; do
+            [[ ! -f $file ]] || printf '%s\0' "$file"
+        done
+}
+
+shell_scripts() {
+    sources | xargs -0 grep -lZE '^#(!.*\b(ba|da)?sh$| shellcheck shell=)' | grep -zvE '\.(in|md)$'
+}
+
+check_format() {
+    sources '*.cpp' '*.h' | xargs -0 clang-format --dry-run -Werror
+}
+
+check_shell() {
+    shell_scripts | xargs -0 shellcheck -x
+}
+
+# must_not_find WHAT GREP-ARGUMENT...: over all text files of the project.
+must_not_find() {
+    local what=$1 status=0
+    shift
+    sources ':!:fuzz/corpus' | xargs -0 grep -nIE "$@" || status=$?
+    [[ $status -ne 0 ]] || die "$what"
+}
+
+check_text() {
+    must_not_find "white space at the end of a line" '[[:blank:]]+$'
+    must_not_find "a carriage return" $'\r'
+    must_not_find "work left to do" '\b(TO''DO|FIX''ME|X''XX)\b'
+    must_not_find "a path of this machine" -F -- "$project/"
+    must_not_find "a suppressed warning without its reason" 'NO''LINT[A-Z]*(\([^)]*\))?[^:(A-Z]*$'
+    local file
+    while IFS= read -r -d '' file; do
+        [[ ! -s $file || -z $(tail -c1 "$file") ]] || die "$file: no line end at the end"
+    done < <(sources '*.cpp' '*.h' '*.in' '*.txt' '*.md' '*.py' '*.json' '*.lib' 'scripts/*')
+}
+
+check_warnings() {
+    configure_and_build dev
+}
+
+check_tidy() {
+    configure_and_build dev
+    # Only what the build knows how to compile.
+    sources '*.cpp' | while IFS= read -r -d '' file; do
+        if grep -qF "\"file\": \"$project/$file\"" build/dev/compile_commands.json; then
+            printf '%s\0' "$file"
+        fi
+    done | xargs -0 -n1 -P"$(nproc)" clang-tidy --quiet -p build/dev
+}
+
+check_sanitizers() {
+    configure_and_build asan
+    ctest --test-dir build/asan -j2 --output-on-failure --no-tests=error -LE '^slow$'
+}
+
+# fuzz_target PROGRAM: from the kept seeds, in a corpus of the build's own.
+fuzz_target() {
+    local name corpus
+    name=$(basename "$1" -fuzz)
+    corpus=build/fuzz/corpus/$name
+    mkdir -p "$corpus" build/fuzz/findings
+    if [[ -d fuzz/corpus/$name ]]; then
+        cp -r "fuzz/corpus/$name/." "$corpus/"
+    fi
+    "$1" "$corpus" -max_total_time="${FUZZ_SECONDS:-20}" -timeout=10 -rss_limit_mb=2048 \
+        -artifact_prefix=build/fuzz/findings/ -verbosity=0
+}
+
+check_fuzz() {
+    local program programs=()
+    configure_and_build fuzz
+    for program in build/fuzz/fuzz/*-fuzz; do
+        [[ -x $program ]] && programs+=("$program")
+    done
+    [[ ${#programs[@]} -gt 0 ]] || die "no fuzz targets"
+    for program in "${programs[@]}"; do
+        fuzz_target "$program"
+    done
+}

@@ -1,0 +1,176 @@
+# shellcheck shell=bash
+# shellcheck disable=SC2154  # works on the variables of its caller
+# The parts of scripts/web-server. They work on its variables: root, run_dir,
+# webapi_dir, service_program, server, port, bind, server_pid, wrapper_pid.
+# Needs common.sh.
+
+# A UNIX socket's path is short; the web server appends a process id to it.
+max_socket_path=90
+
+# Checks server, port and bind, and sets host (what a client writes in a URL),
+# listen (what the configuration says) and address (host and port).
+check_address() {
+    case $server in
+        lighttpd | nginx | apache) ;;
+        *) usage_error "no web server '$server': lighttpd, nginx or apache" ;;
+    esac
+    [[ $port =~ ^[1-9][0-9]{0,4}$ && $port -le 65535 ]] || usage_error "'$port' is no port"
+    [[ $bind =~ ^[0-9a-zA-Z.:-]+$ ]] || usage_error "'$bind' is no address"
+    host=$bind listen=$bind
+    [[ $bind == 0.0.0.0 ]] && host=127.0.0.1
+    [[ $bind == :: ]] && host=::1
+    local client=$host
+    [[ $host == *:* ]] && host="[$host]"
+    [[ $listen == *:* ]] && listen="[$listen]"
+    address=$host:$port
+    if (exec 3<>"/dev/tcp/$client/$port") 2>/dev/null; then
+        die "port $port of $bind is taken: choose another one with --port"
+    fi
+}
+
+# The paths end up between double quotes in configurations.
+prepare_run_dir() {
+    local path
+    for path in "$root" "$run_dir"; do
+        [[ $path =~ [[:cntrl:]\"\'\$\\%] ]] && die "a web server cannot work in '$path'"
+    done
+    if [[ -e $run_dir && ! -e $run_dir/.web-server ]] && [[ -n $(ls -A "$run_dir") ]]; then
+        die "$run_dir is not empty and not a web server's"
+    fi
+    if [[ -s $run_dir/server.pid ]] && kill -0 "$(cat "$run_dir/server.pid")" 2>/dev/null; then
+        die "a web server works in $run_dir already"
+    fi
+    rm -rf "$run_dir"
+    mkdir -p "$run_dir/tmp" "$run_dir/htdocs"
+    : >"$run_dir/.web-server"
+    cp "$project/packaging/web-servers/index.html" "$run_dir/htdocs/"
+    socket_dir=$run_dir
+    if [[ ${#run_dir} -gt $((max_socket_path - 16)) ]]; then
+        socket_dir=$(mktemp -d)
+    fi
+}
+
+# nginx and lighttpd work as whoever started them; nginx has to be told so.
+write_configuration() {
+    local text user_line=''
+    [[ $EUID -eq 0 ]] && user_line="user root;"
+    text=$(<"$project/packaging/web-servers/$server.conf.in")
+    text=${text//@RUN_DIR@/"$run_dir"}
+    text=${text//@SOCKET_DIR@/"$socket_dir"}
+    text=${text//@WEBAPI_DIR@/"$webapi_dir"}
+    text=${text//@LISTEN@/"$listen"}
+    text=${text//@PORT@/"$port"}
+    text=${text//@USER_LINE@/"$user_line"}
+    printf '%s\n' "$text" >"$run_dir/$server.conf"
+}
+
+# What the platform calls when a response asks for a restart of the web server.
+# Each server's graceful signal: running requests end undisturbed.
+write_service_program() {
+    local signal=USR1
+    [[ $server == nginx ]] && signal=HUP
+    mkdir -p "$(dirname "$service_program")"
+    cat >"$service_program.new" <<END
+#!/bin/sh -e
+# Written by scripts/web-server, for the web server of $run_dir.
+[ "\$1 \$2" = "httpd restart" ] || exit 1
+kill -s $signal "\$(cat '$run_dir/server.pid')"
+END
+    chmod 755 "$service_program.new"
+    mv "$service_program.new" "$service_program"
+}
+
+# The server ends with this script, however this one ends.
+launch() {
+    setpriv --pdeathsig TERM "$@" >>"$run_dir/output.log" 2>&1 </dev/null &
+    server_pid=$!
+    echo "$server_pid" >"$run_dir/server.pid"
+}
+
+start_wrapper() {
+    (cd "$run_dir" && exec setsid setpriv --pdeathsig TERM \
+        fcgiwrap -c 8 -s "unix:$socket_dir/fcgi.sock") >>"$run_dir/wrapper.log" 2>&1 </dev/null &
+    wrapper_pid=$!
+    local try
+    for try in {1..100}; do
+        [[ -S $socket_dir/fcgi.sock ]] && return
+        kill -0 "$wrapper_pid" 2>/dev/null || break
+        sleep 0.05
+    done
+    show_log
+    die "fcgiwrap did not start ($try tries)"
+}
+
+# Apache refuses to serve as root. It works as nobody, who may read what root
+# may: a checkout often lies in a folder that is closed to others.
+start_server() {
+    local PATH=$PATH:/usr/sbin:/sbin privileges=()
+    case $server in
+        lighttpd) launch lighttpd -D -f "$run_dir/lighttpd.conf" ;;
+        nginx)
+            start_wrapper
+            launch nginx -p "$run_dir" -c "$run_dir/nginx.conf" -e "$run_dir/error.log"
+            ;;
+        apache)
+            if [[ $EUID -eq 0 ]]; then
+                privileges=(--reuid=65534 --regid=65534 --clear-groups
+                    --inh-caps=+dac_override --ambient-caps=+dac_override)
+            fi
+            launch "${privileges[@]}" apache2 -D FOREGROUND -f "$run_dir/apache.conf"
+            ;;
+    esac
+}
+
+await_ready() {
+    local try
+    for try in {1..200}; do
+        if curl --noproxy '*' -gfs -o "$run_dir/tmp/index" "http://$address/" 2>/dev/null; then
+            rm -f "$run_dir/tmp/index"
+            kill -0 "$server_pid" 2>/dev/null && return
+        fi
+        kill -0 "$server_pid" 2>/dev/null || break
+        sleep 0.05
+    done
+    show_log
+    die "$server does not answer on $address ($try tries)"
+}
+
+show_log() {
+    tail -n 20 -- "$run_dir"/*.log >&2 || true
+}
+
+show_examples() {
+    local entry="http://$address/webapi/entry.cgi"
+    cat <<END
+
+Try, in another terminal:
+  curl '$entry?api=TALO.System&version=1&method=ping&text=hi'
+  curl -d 'api=TALO.System&version=1&method=ping&count=3' $entry
+  curl -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
+END
+}
+
+# stop_process PID [GROUP]: asks, waits five seconds, insists.
+stop_process() {
+    local target=$1 try
+    [[ -n $1 ]] || return 0
+    [[ ${2-} == group ]] && target=-$1
+    kill -TERM -- "$target" 2>/dev/null || return 0
+    for try in {1..100}; do
+        kill -0 "$1" 2>/dev/null || break
+        [[ $try -lt 100 ]] || kill -KILL -- "$target" 2>/dev/null || true
+        sleep 0.05
+    done
+    wait "$1" 2>/dev/null || true
+}
+
+stop_all() {
+    trap '' INT TERM HUP
+    stop_process "$server_pid"
+    stop_process "$wrapper_pid" group
+    rm -f "$run_dir/server.pid"
+    if grep -qsF -- "for the web server of $run_dir." "$service_program"; then
+        rm -f "$service_program"
+    fi
+    [[ ${socket_dir-$run_dir} == "$run_dir" ]] || rm -rf "$socket_dir"
+}

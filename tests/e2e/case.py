@@ -1,0 +1,42 @@
+"""What the cases of all files have in common."""
+
+import tempfile
+import pathlib
+import unittest
+
+from client import Client
+from webserver import HOST
+
+
+class Case(unittest.TestCase):
+    server = None  # the WebServer of this run
+
+    def setUp(self):
+        self.client = Client(HOST, self.server.port)
+        folder = tempfile.TemporaryDirectory(dir=self.server.run_dir / "tmp")
+        self.addCleanup(folder.cleanup)
+        self.folder = pathlib.Path(folder.name)
+
+    def check_document(self, reply, document):
+        self.assertIsNotNone(reply, "the server closed the connection")
+        self.assertEqual(reply.document(), document, reply)
+        self.assertEqual(reply.header("Content-type"), 'text/html; charset="UTF-8"')
+
+    def succeeds(self, reply, data=None):
+        document = {"success": True} if data is None else {"success": True, "data": data}
+        self.check_document(reply, document)
+        self.assertEqual(reply.status, 200)
+
+    def fails(self, reply, code):
+        self.check_document(reply, {"success": False, "error": {"code": code}})
+        self.assertEqual(reply.status, 200)
+
+    def by_server(self, **expectations):
+        """What is expected of the server of this run; see docs/web-servers.md."""
+        return expectations[self.server.name]
+
+    def answers_itself(self, reply, status):
+        """The web server refuses on its own: the entry never sees the request."""
+        self.assertIsNotNone(reply, "the server closed the connection")
+        self.assertEqual(reply.status, status, reply)
+        self.assertNotIn(b'"success"', reply.body)

@@ -1,0 +1,86 @@
+"""All end-to-end cases against one web server: run.py --help."""
+
+import argparse
+import os
+import pathlib
+import re
+import shutil
+import signal
+import sys
+import unittest
+
+HERE = pathlib.Path(__file__).resolve().parent
+sys.path.insert(0, str(HERE))
+
+from case import Case  # noqa: E402
+from webserver import WebServer, processes_that_mention, wait_until  # noqa: E402
+
+SANITIZER = re.compile(r"ERROR: \w*Sanitizer|runtime error:")
+
+
+def install_test_apis(root, modules):
+    """Puts the test APIs beside the shipped ones; gives the list of the files."""
+    webapi_dir = pathlib.Path(root) / "usr/talo/taloman/webapi"
+    installed = []
+    if not list(pathlib.Path(modules).glob("*.so")):
+        raise SystemExit(f"no API libraries in {modules}")
+    for source, folder in (
+            [(path, webapi_dir / "lib") for path in pathlib.Path(modules).glob("*.so")] +
+            [(path, webapi_dir) for path in HERE.parent.glob("modules/*.lib")] +
+            [(path, webapi_dir) for path in HERE.glob("*.lib")]):
+        installed.append(folder / source.name)
+        shutil.copy(source, installed[-1])
+    return installed
+
+
+def run_cases(pattern):
+    loader = unittest.TestLoader()
+    if pattern:
+        loader.testNamePatterns = [f"*{pattern}*"]
+    suite = loader.discover(str(HERE), pattern="test_*.py")
+    result = unittest.TextTestRunner(verbosity=2).run(suite)
+    return result.testsRun > 0 and result.wasSuccessful() and not result.skipped
+
+
+def complaints_after(server, status):
+    if status != 0:
+        yield f"the script ended with {status}: {''.join(server.script.output)}"
+    if not wait_until(lambda: not processes_that_mention(str(server.run_dir))):
+        yield f"still running: {processes_that_mention(str(server.run_dir))}"
+    if server.service_program.exists():
+        yield f"{server.service_program} was left behind"
+    for line in server.logs().splitlines():
+        if SANITIZER.search(line):
+            yield line
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__)
+    parser.add_argument("--server", required=True, choices=("lighttpd", "nginx", "apache"))
+    parser.add_argument("--root", required=True, help="the installed root")
+    parser.add_argument("--run-dir", required=True, help="the web server's own folder")
+    parser.add_argument("--modules", required=True, help="folder of the test API libraries")
+    parser.add_argument("pattern", nargs="?", help="only cases with this in their name")
+    arguments = parser.parse_args()
+    run_dir = os.path.abspath(arguments.run_dir)
+
+    installed = install_test_apis(arguments.root, arguments.modules)
+    try:
+        server = Case.server = WebServer(arguments.server, arguments.root, run_dir)
+        try:
+            passed = run_cases(arguments.pattern)
+        finally:
+            status = server.script.stop(signal.SIGTERM)
+        complaints = list(complaints_after(server, status))
+    finally:
+        for path in installed:
+            path.unlink(missing_ok=True)
+    for complaint in complaints:
+        print(complaint, file=sys.stderr)
+    if not passed:
+        print(server.logs()[-4000:], file=sys.stderr)
+    return 0 if passed and not complaints else 1
+
+
+if __name__ == "__main__":
+    sys.exit(main())
