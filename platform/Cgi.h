@@ -71,8 +71,10 @@ TALO_PLATFORM void TaloCgiFree(TALOCGI* ctx);
 // Looks up the session `sessionId` and checks what the request asks for. On an
 // accepted id (result 0 or more) writes the login name, zero-terminated, into
 // `name` (`size` bytes) and fills the context's session members.
-// 1 a user, 2 an administrator, 0 no access, -1 timed out, -3 the client's
-// address changed, other negatives refusals. `flags` is reserved and 0.
+// 1 a user, 2 an administrator, 0 no access; -1 timed out, -2 no such session,
+// -3 the client's address changed, -4 the request comes from another site's
+// page, -6 the account is gone or locked. -5 is never answered: the framework
+// uses it for "not asked". `flags` is reserved and 0. Does not renew the session.
 TALO_PLATFORM int TaloCgiIsAuthorizedEx(TALOCGI* ctx, const char* sessionId, char* name,
                                         size_t size, const TALOCGIAUTHREQUEST* request, int flags);
 

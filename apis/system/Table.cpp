@@ -1,4 +1,5 @@
 #include "System.h"
+#include "apis/common/RequireSession.h"
 #include "webapi/APIExport.h"
 #include "webapi/APITable.h"
 
@@ -11,8 +12,21 @@ TALO::_tag_API_TABLE table[] = {
     {nullptr, 0, nullptr, nullptr},
 };
 
+int CheckInfo(TALO::APIRequest* request, TALO::APIResponse* response) {
+    return RequireSession(request, response, SessionUse::kRenew) ? 1 : 0;
+}
+
+TALO::_tag_API_CHECK_TABLE checkTable[] = {
+    {"TALO.System", 2, "info", CheckInfo, nullptr, nullptr},
+    {nullptr, 0, nullptr, nullptr, nullptr, nullptr},
+};
+
 }  // namespace
 
 WEBAPI_LIBRARY_EXPORT TALO::_tag_API_TABLE* GetAPITable() {
     return table;
+}
+
+WEBAPI_LIBRARY_EXPORT TALO::_tag_API_CHECK_TABLE* GetAPICheckTable() {
+    return checkTable;
 }

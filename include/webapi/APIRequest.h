@@ -109,6 +109,37 @@ class WEBAPI_EXPORT APIRequest {
     std::string GetLoginUserName() const;
     std::string GetWebAPIPriv() const;
 
+    /// The user's numeric id, 4294967295 when there is no user. Each call asks the
+    /// platform unless the session facts hold it.
+    unsigned int GetLoginUID() const;
+
+    /// The classes of user that the API admits, as a mask: 1 admin.local,
+    /// 2 admin.domain, 4 admin.ldap, 8 normal.local, 16 normal.domain, 32 normal.ldap.
+    int GetAllowUser() const;
+
+    /// The URL under which the client reached the entry: scheme, host (IPv6
+    /// literals with their brackets) and port, or the default. Name and path are
+    /// not kept: these two always answer their default.
+    std::string GetURLProto(const std::string& fallback) const;
+    std::string GetURLHost(const std::string& fallback) const;
+    int GetURLPort(int fallback) const;
+    std::string GetURLName(const std::string& fallback) const;
+    std::string GetURLPath(const std::string& fallback) const;
+
+    /// The client's address, "" when it is not known.
+    std::string GetRemoteIP() const;
+
+    /// Client types are not kept: all of these always answer false.
+    bool IsMobile() const;
+    bool IsIPhone() const;
+    bool IsAndroid() const;
+    bool IsIEMobile() const;
+    bool IsIPad() const;
+    bool IsPlayBook() const;
+    bool IsBlackBerry6() const;
+    bool IsWebKit() const;
+    bool IsSupportWebApp() const;
+
     /// The preference folder of the login user, or of a group; "/tmp" when there is none.
     std::string GetPreferenceDir() const;
     std::string GetGroupPreferenceDir(const std::string& group) const;

@@ -67,6 +67,17 @@ class WEBAPI_EXPORT APIResponse {
     bool SetStatus(_tag_HTTP_STATUS_CODE code, const std::string& message);
     int GetStatus() const;
 
+    /// Adds a cookie for the browser session; the value is percent-encoded. The
+    /// path comes first, then name and value. A name is letters, digits, "_" and
+    /// "-". The line leaves as "NAME=VALUE; path=PATH", without a header name in
+    /// front: to set a cookie on the wire, use SetHeader("Set-Cookie", ...).
+    bool AddCookie(const std::string& path, const std::string& name, const std::string& value);
+
+    /// Sends the client to a path of the host that it used, with status 302. A
+    /// whole URL is not recognised as one. False without a request; throws
+    /// std::out_of_range for an empty path.
+    bool Redirect(const std::string& path);
+
     /// Whether the framework prints header and body. A method that has written
     /// its own answer switches it off.
     void SetEnableOutput(bool enable);

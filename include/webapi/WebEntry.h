@@ -43,6 +43,14 @@ class WEBAPI_EXPORT WebEntry : public APIRunner {
     bool HandleUpload(APIRequest* request, APIResponse* response) override;
     bool SkipPermission(APIRequest* request) override;
 
+    /// The session check alone: 0, 105, 106 or 119. Asks the platform once for
+    /// each variant; the session's facts go to the entry's own request.
+    int CheckPermission(bool allowTimeout);
+
+    /// Whether the "allowUser" list of the request's API has the class of the
+    /// entry's caller. An API without a list admits nobody.
+    bool CheckAllowUser(APIRequest* request, const char* userName);
+
     /// Read the parameters into "getParam" and "postParam" of a document.
     bool InitParam(Json::Value& document);
     bool InitGetParam(Json::Value& getParam);
@@ -67,6 +75,7 @@ class WEBAPI_EXPORT WebEntry : public APIRunner {
 
   private:
     void AdoptSessionParameter();
+    void RenewSession(APIRequest* request, bool allowTimeout);
 
     Json::Value uploadFiles;
     TALOCGI* cgiContext;

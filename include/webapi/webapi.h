@@ -4,6 +4,7 @@
 /// Everything that the library offers, for authors of API libraries and of
 /// programs that serve or run them.
 
+#include "webapi/APIAuth.h"
 #include "webapi/APIBase.h"
 #include "webapi/APIExport.h"
 #include "webapi/APIParameter.h"

@@ -72,6 +72,13 @@ long long ToInt64(const Json::Value& value, long long fallback) {
     return ReadInt64(value, &number) ? number : fallback;
 }
 
+unsigned int ToUInt(const Json::Value& value, unsigned int fallback) {
+    long long number = 0;
+    const bool fits = ReadInt64(value, &number) && number >= std::numeric_limits<int>::min() &&
+                      number <= std::numeric_limits<unsigned int>::max();
+    return fits ? static_cast<unsigned int>(number) : fallback;
+}
+
 bool ToBool(const Json::Value& value) {
     switch (value.type()) {
         case Json::stringValue:

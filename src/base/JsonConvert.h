@@ -22,6 +22,10 @@ const Json::Value& Member(const Json::Value& value, const std::string& name);
 int ToInt(const Json::Value& value, int fallback);
 long long ToInt64(const Json::Value& value, long long fallback);
 
+// An identifier of 32 bits; a negative number reads as its two's complement, so
+// that -1 is "none" with all bits set.
+unsigned int ToUInt(const Json::Value& value, unsigned int fallback);
+
 // True for a non-empty text, a non-zero number, a non-empty array or object.
 bool ToBool(const Json::Value& value);
 

@@ -33,6 +33,20 @@ std::string EscapeControls(const char* text) {
     return out;
 }
 
+// Builds the line, with its place unless `source` is null, and hands it over.
+__attribute__((format(printf, 4, 0))) void Finish(int priority, const char* source, int line, const char* format, va_list arguments) {
+    const int keptErrno = errno;
+    char message[kMaxLine];
+    int prefix =
+        source != nullptr ? std::snprintf(message, sizeof message, "%s:%d ", source, line) : 0;
+    prefix = prefix < 0 || prefix >= kMaxLine ? 0 : prefix;
+    errno = keptErrno;
+    (void)std::vsnprintf(message + prefix, sizeof message - static_cast<size_t>(prefix), format,
+                         arguments);
+    currentSink(priority, EscapeControls(message).c_str());
+    errno = keptErrno;
+}
+
 }  // namespace
 
 LogSink SetLogSink(LogSink sink) {
@@ -42,18 +56,17 @@ LogSink SetLogSink(LogSink sink) {
 }
 
 void LogAt(int priority, const char* source, int line, const char* format, ...) {
-    const int keptErrno = errno;
-    char message[kMaxLine];
-    int prefix = std::snprintf(message, sizeof message, "%s:%d ", source, line);
-    prefix = prefix < 0 || prefix >= kMaxLine ? 0 : prefix;
     va_list arguments;
     va_start(arguments, format);
-    errno = keptErrno;
-    (void)std::vsnprintf(message + prefix, sizeof message - static_cast<size_t>(prefix), format,
-                         arguments);
+    Finish(priority, source, line, format, arguments);
     va_end(arguments);
-    currentSink(priority, EscapeControls(message).c_str());
-    errno = keptErrno;
+}
+
+void LogMessage(int priority, const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    Finish(priority, nullptr, 0, format, arguments);
+    va_end(arguments);
 }
 
 }  // namespace TALO

@@ -17,6 +17,9 @@ LogSink SetLogSink(LogSink sink);
 void LogAt(int priority, const char* source, int line, const char* format, ...)
     __attribute__((format(printf, 4, 5)));
 
+// The same without the place in front, for messages that carry it in another form.
+void LogMessage(int priority, const char* format, ...) __attribute__((format(printf, 2, 3)));
+
 }  // namespace TALO
 
 // A file that logs names itself in a constant kSource.

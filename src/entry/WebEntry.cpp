@@ -49,9 +49,7 @@ std::string CookieWithSession(const std::string& header, const std::string& sess
 }  // namespace
 
 WebEntry::WebEntry()
-    : uploadFiles(Json::arrayValue),
-      cgiContext(new TALOCGI()),
-      permissionCache(Json::objectValue) {
+    : uploadFiles(Json::arrayValue), cgiContext(new TALOCGI()), permissionCache(Json::objectValue) {
     (void)TaloCgiInit("", cgiContext);
     (void)TaloCgiLoadInCookies(cgiContext);
     permissionCache["permResult"] = Json::Value(Json::arrayValue);
@@ -125,18 +123,6 @@ void WebEntry::AdoptSessionParameter() {
     Json::Value document(Json::objectValue);
     document["HTTP_COOKIE"] = cookie;
     request->InitEnv(document);
-}
-
-bool WebEntry::NeedPermission(APIRequest* request) {
-    return APIRunner::NeedPermission(request);
-}
-
-bool WebEntry::CheckPermission(APIRequest* request, APIResponse* response) {
-    return APIRunner::CheckPermission(request, response);
-}
-
-bool WebEntry::SkipPermission(APIRequest* request) {
-    return APIRunner::SkipPermission(request);
 }
 
 // Only methods that read the body themselves can be called with an upload.

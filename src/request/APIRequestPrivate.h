@@ -25,6 +25,16 @@ class APIRequestPrivate : public APIBase {
     bool DecryptParam(Json::Value& params);
     bool DecryptAESParam(Json::Value& params);
 
+    // The parts of the URL and the client flags are worked out on each use.
+    void InitURL();
+    bool ParseProtocol();
+    bool ParseHostAndPort();
+    bool ParsePathAndName();
+    void InitUA();
+    bool ClientFlag(const char* key);
+
+    unsigned int GetLoginUID();
+
     template <typename T>
     APIParameter<T> GetAndCheckParam(const std::string& name, bool required, Json::ValueType type,
                                      typename APIParameter<T>::Validator validator) {

@@ -18,6 +18,11 @@ class APIResponsePrivate : public APIBase {
     virtual ~APIResponsePrivate();
 
     void SetError(int code, const Json::Value& details);
+    // Zero minutes keep the cookie for the browser session, negative ones delete
+    // it. Mind the order: the public form takes the path first.
+    bool AddCookie(const std::string& name, const std::string& value, const std::string& path,
+                   long expireMinutes, const std::string& domain, bool secure, bool httponly);
+    bool Redirect(const std::string& path);
     void SetCallbackFunc(APIResponse::CallbackFunc function, void* argument);
 
     APIRequest* request;

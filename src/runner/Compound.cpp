@@ -82,6 +82,8 @@ int APIRunner::HandleCompound(APIRequest* request, APIResponse* response) {
     for (const Json::Value& params : list) {
         Json::Value document(Json::objectValue);
         document["postParam"] = params;
+        // What one element may know of the login is none of the next one's business.
+        element->InitSession(Json::Value());
         const bool readable = params.isObject() && Guarded(kSource, __LINE__, [&] {
                                   element->InitParam(document, true);
                               });

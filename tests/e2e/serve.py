@@ -1,6 +1,8 @@
 """scripts/serve in a fresh copy of the project, as a new user meets it."""
 
+import json
 import pathlib
+import re
 import shutil
 import signal
 import socket
@@ -34,6 +36,8 @@ def copy_project(folder):
 
 
 class Serve(unittest.TestCase):
+    administrator = None  # name and password, once a new root has shown them
+
     @classmethod
     def setUpClass(cls):
         # Closed to others, as a home folder is.
@@ -55,6 +59,7 @@ class Serve(unittest.TestCase):
         print(f"{arguments}: ready after {time.monotonic() - before:.1f} s", file=sys.stderr)
         self.assertIn(f"ready http://{HOST}:{port}/\n", script.output)
         self.assertIn(b'"success":true', Client(HOST, port).get(PING).body)
+        self.logs_in(script, Client(HOST, port))
         self.assertTrue(wait_until(lambda: "".join(script.output).count("curl ") == 3))
         self.assertEqual(script.stop(number), 0, "".join(script.output))
         self.assertTrue(wait_until(lambda: not processes_that_mention(str(self.checkout))),
@@ -63,6 +68,19 @@ class Serve(unittest.TestCase):
             again.setsockopt(socket.SOL_SOCKET, socket.SO_REUSEADDR, 1)
             again.bind((HOST, port))
 
+    def logs_in(self, script, client):
+        """The administrator of a new root is shown once, before the ready line."""
+        shown = re.findall(r"^administrator: (\S+) (\S+)$(?=.*^ready)", "".join(script.output),
+                           re.MULTILINE | re.DOTALL)
+        if self.administrator is None:
+            self.assertEqual(len(shown), 1, "".join(script.output))
+            type(self).administrator = shown[0]
+        else:
+            self.assertEqual(shown, [])
+        name, password = self.administrator
+        reply = client.call("TALO.Session", "open", account=name, passwd=json.dumps(password))
+        self.assertTrue(reply.document()["success"], reply)
+
     def test_serves_with_each_web_server_until_it_is_told_to_stop(self):
         self.serves_and_stops(signal.SIGTERM)
         self.serves_and_stops(signal.SIGINT)
@@ -70,6 +88,8 @@ class Serve(unittest.TestCase):
             for number in (signal.SIGINT, signal.SIGTERM):
                 with self.subTest(server, signal=number):
                     self.serves_and_stops(number, "--server", server)
+        type(self).administrator = None
+        self.serves_and_stops(signal.SIGTERM, "--reset")
 
     def test_says_so_when_the_port_is_taken(self):
         with socket.socket() as taken:

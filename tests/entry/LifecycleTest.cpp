@@ -44,7 +44,9 @@ TEST_F(WebEntryLife, OverridesTheSixSlotsOfTheRunnerAndAddsNone) {
     EXPECT_EQ(Slot(&TALO::WebEntry::Run), 0u);
     EXPECT_EQ(Slot(&TALO::WebEntry::Initialize), 1u);
     EXPECT_EQ(Slot(&TALO::WebEntry::NeedPermission), 2u);
-    EXPECT_EQ(Slot(&TALO::WebEntry::CheckPermission), 3u);
+    EXPECT_EQ(Slot(static_cast<bool (TALO::WebEntry::*)(TALO::APIRequest*, TALO::APIResponse*)>(
+                  &TALO::WebEntry::CheckPermission)),
+              3u);
     EXPECT_EQ(Slot(&TALO::WebEntry::HandleUpload), 4u);
     EXPECT_EQ(Slot(&TALO::WebEntry::SkipPermission), 5u);
     EXPECT_EQ(Slot(&Widened::Next), 6u);

@@ -19,6 +19,58 @@ struct ServiceCall {
     int flags;
 };
 
+struct Session {
+    std::string user;
+    int result = 1;          // what the check answers
+    int timeoutAllowed = 1;  // what it answers when timed-out sessions count
+    std::map<int, std::string> options;
+    std::string language = "enu";
+    std::string file;  // what the context then names as the session's file
+};
+
+struct AuthCall {
+    std::string sessionId;
+    int checkMask;
+    int allowTimeout;
+    size_t nameSize;
+    bool nameWasZero;
+    int flags;
+};
+
+struct OptionCall {
+    int option;
+    std::string fallback;  // "(null)" for none
+};
+
+struct RemoteCall {
+    size_t size;
+    bool bufferWasZero;
+};
+
+struct UidCall {
+    std::string sessionId;
+    std::string user;
+};
+
+struct ContextCall {
+    int timeout;
+    int allowTimeout;
+    std::string userClass;
+    std::string prefix;
+};
+
+struct PrivilegeCall {
+    std::string user;
+    std::string privilege;
+    std::string remoteIP;
+};
+
+struct TouchCall {
+    std::string path;
+    int now;
+    long when;
+};
+
 struct Platform {
     std::map<std::string, std::string> files;            // path to content
     std::set<std::string> administrators;                // user names
@@ -27,11 +79,27 @@ struct Platform {
     std::string
         decipheredLine;  // what TaloCgiDetectAndDecryptParamLine leaves, "" for the line itself
 
-    std::vector<ServiceCall> services;     // calls of TLIBNetService
-    std::vector<std::string> unlinked;     // paths given to TLIBCSysUnlink
-    std::vector<std::string> cookiesRead;  // HTTP_COOKIE at each TaloCgiLoadInCookies
-    int openContexts = 0;                  // TaloCgiInit less TaloCgiFree
-    std::vector<std::string> journal;      // every operation by name, in order
+    std::map<std::string, Session> sessions;  // by id
+    std::string sessionDir = "/session";
+    int defaultTimeout = 30;
+    int skipIPCheck = 0;
+    int configuredTimeout = 15;        // TLIBCConfGetORBTimeout
+    std::string remoteAddress;         // "" makes TaloCgiGetRemoteIP fail
+    std::map<std::string, int> uids;   // user to id
+    std::set<std::string> privileges;  // "user/privilege"
+
+    std::vector<AuthCall> authCalls;            // calls of TaloCgiIsAuthorizedEx
+    std::vector<ContextCall> contextCalls;      // calls of TaloCgiInitEx
+    std::vector<OptionCall> optionCalls;        // calls of TaloCgiGetOption
+    std::vector<RemoteCall> remoteCalls;        // calls of TaloCgiGetRemoteIP
+    std::vector<UidCall> uidCalls;              // calls of TaloCgiUIDGet
+    std::vector<PrivilegeCall> privilegeCalls;  // calls of TLIBAppPrivUserHas
+    std::vector<TouchCall> touched;             // calls of TLIBCFileUTime
+    std::vector<ServiceCall> services;          // calls of TLIBNetService
+    std::vector<std::string> unlinked;          // paths given to TLIBCSysUnlink
+    std::vector<std::string> cookiesRead;       // HTTP_COOKIE at each TaloCgiLoadInCookies
+    int openContexts = 0;                       // TaloCgiInit less TaloCgiFree
+    std::vector<std::string> journal;           // every operation by name, in order
 
     std::map<std::string, int> calls;   // operation to number of calls
     std::map<std::string, int> failAt;  // operation to the call that fails, counted from 1

@@ -60,6 +60,28 @@ int TLIBGroupIsAdminGroupMem(const char* user, int) {
     return fake::Now().administrators.count(user) ? 1 : 0;
 }
 
+int TLIBAppPrivUserHas(const char* user, const char* privilege, const char* remoteIP) {
+    fake::Now().privilegeCalls.push_back({user, privilege, remoteIP});
+    return fake::Now().privileges.count(std::string(user) + "/" + privilege) ? 1 : 0;
+}
+
+int TLIBCConfGetORBTimeout(void) {
+    return fake::Now().configuredTimeout;
+}
+
+int TLIBCFileUTime(const char* path, int now, long when) {
+    fake::Now().touched.push_back({path, now, when});
+    return fake::Now().Called("TLIBCFileUTime") ? -1 : 0;
+}
+
+void TLIBCStrCaseLower(char* text, size_t size) {
+    for (size_t index = 0; (size == 0 || index < size) && text[index] != '\0'; ++index) {
+        if (text[index] >= 'A' && text[index] <= 'Z') {
+            text[index] = static_cast<char>(text[index] - 'A' + 'a');
+        }
+    }
+}
+
 int TALOUserPreferenceDirGet(const char* user, char* buffer, size_t size) {
     if (fake::Now().Called("TALOUserPreferenceDirGet")) {
         return -1;

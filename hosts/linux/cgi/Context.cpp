@@ -1,18 +1,15 @@
 #include <cstdlib>
 #include <cstring>
-#include <map>
-#include <new>
+#include <exception>
 #include <string>
 
+#include "hosts/linux/cgi/SessionStore.h"
+#include "hosts/linux/cgi/State.h"
+#include "hosts/linux/conf/KeyValueFile.h"
 #include "hosts/linux/util/ParameterLine.h"
 #include "hosts/linux/util/Percent.h"
 #include "platform/Cgi.h"
-
-// The cookies of the request, by name; the last of a name counts.
-struct TALOCGIState {
-    std::string prefix;
-    std::map<std::string, std::string> cookies;
-};
+#include "platform/System.h"
 
 namespace {
 
@@ -28,6 +25,20 @@ std::map<std::string, std::string> ParseCookies(const std::string& header) {
     return cookies;
 }
 
+// Fills a zeroed context; what was made so far hangs on it when this throws.
+int Prepare(const char* prefix, TALOCGI* ctx) {
+    ctx->state = new TALOCGIState();
+    ctx->state->prefix = prefix != nullptr ? prefix : "";
+    ctx->defaultTimeout = TLIBCConfGetORBTimeout();
+    ctx->skipIPCheck = host::HostSetting("skip_ip_check", "no") == "yes" ? 1 : 0;
+    const std::string dir = host::SessionDir();
+    if (dir.size() >= sizeof ctx->sessionDir) {
+        return -1;
+    }
+    std::memcpy(ctx->sessionDir, dir.c_str(), dir.size() + 1);
+    return 0;
+}
+
 }  // namespace
 
 extern "C" {
@@ -37,12 +48,22 @@ int TaloCgiInit(const char* prefix, TALOCGI* ctx) {
         return -1;
     }
     try {
-        ctx->state = new TALOCGIState();
-        ctx->state->prefix = prefix != nullptr ? prefix : "";
-        return 0;
-    } catch (const std::bad_alloc&) {
+        return Prepare(prefix, ctx);
+    } catch (const std::exception&) {
         return -1;
     }
+}
+
+int TaloCgiInitEx(TALOCGI* ctx, int timeout, int allowTimeout, const char* userClass,
+                  const char* prefix) {
+    // The users that are logged in are the only class that there is.
+    if (userClass == nullptr || std::strcmp(userClass, "current.users") != 0 ||
+        TaloCgiInit(prefix, ctx) != 0) {
+        return -1;
+    }
+    ctx->defaultTimeout = timeout > 0 ? timeout : ctx->defaultTimeout;
+    ctx->state->allowTimeout = allowTimeout != 0;
+    return 0;
 }
 
 int TaloCgiLoadInCookies(TALOCGI* ctx) {
@@ -53,7 +74,7 @@ int TaloCgiLoadInCookies(TALOCGI* ctx) {
     try {
         ctx->state->cookies = ParseCookies(header != nullptr ? header : "");
         return 0;
-    } catch (const std::bad_alloc&) {
+    } catch (const std::exception&) {
         return -1;
     }
 }

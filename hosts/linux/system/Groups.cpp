@@ -1,83 +1,71 @@
-#include <errno.h>
-#include <grp.h>
-#include <pwd.h>
-#include <string.h>
+#include <cstring>
 
-#include <new>
-#include <vector>
-
+#include "hosts/linux/account/Backend.h"
+#include "hosts/linux/account/SystemAccounts.h"
+#include "hosts/linux/sdk/Accounts.h"
+#include "hosts/linux/util/Network.h"
 #include "platform/System.h"
 
 namespace {
 
-const char kAdministrators[] = "administrators";
+const char kSuperuser[] = "root";
 
-// A directory service may hold groups of many members; this bounds what a
-// look-up may ask for.
-constexpr size_t kMaxRecord = 1u << 20;
-
-// Calls a re-entrant look-up with a buffer that grows until the record fits.
-// Positive when found, 0 when there is none, negative on an error.
-template <typename Lookup>
-int Find(std::vector<char>* buffer, Lookup lookup) {
-    for (buffer->resize(4096); buffer->size() <= kMaxRecord; buffer->resize(buffer->size() * 4)) {
-        bool found = false;
-        const int error = lookup(buffer->data(), buffer->size(), &found);
-        if (error == 0) {
-            return found ? 1 : 0;
-        }
-        if (error != ERANGE) {
-            return error == ENOENT || error == ESRCH ? 0 : -1;
-        }
+// With a file of accounts the superuser keeps his right, unless the file has an
+// account of that name: the machine must stay manageable from its console.
+int IsAdministrator(const char* user) {
+    if (host::UsesSystemAccounts()) {
+        return host::IsSystemAdministrator(user);
     }
-    return -1;
+    talo::Account account;
+    switch (host::FindAccountOf(user, &account)) {
+        case host::Lookup::kFound:
+            return talo::IsAdministrator(account) ? 1 : 0;
+        case host::Lookup::kAbsent:
+            return std::strcmp(user, kSuperuser) == 0 ? host::IsSystemAdministrator(user) : 0;
+        default:
+            return -1;
+    }
 }
 
-bool Lists(char* const* members, const char* user) {
-    for (; *members != nullptr; ++members) {
-        if (strcmp(*members, user) == 0) {
+bool HoldsFrom(const talo::Account& account, const std::string& privilege,
+               const std::string& address) {
+    const auto held = account.privileges.find(privilege);
+    if (held == account.privileges.end()) {
+        return false;
+    }
+    for (const std::string& network : held->second) {
+        if (host::InNetwork(address, network)) {
             return true;
         }
     }
-    return false;
-}
-
-// The superuser, and the members of the group by list or as their own group.
-int IsAdministrator(const char* user) {
-    std::vector<char> userBuffer;
-    std::vector<char> groupBuffer;
-    struct passwd account = {};
-    struct group administrators = {};
-    const int known = Find(&userBuffer, [&](char* buffer, size_t size, bool* found) {
-        struct passwd* result = nullptr;
-        const int error = getpwnam_r(user, &account, buffer, size, &result);
-        *found = result != nullptr;
-        return error;
-    });
-    if (known <= 0 || account.pw_uid == 0) {
-        return known;
-    }
-    const int grouped = Find(&groupBuffer, [&](char* buffer, size_t size, bool* found) {
-        struct group* result = nullptr;
-        const int error = getgrnam_r(kAdministrators, &administrators, buffer, size, &result);
-        *found = result != nullptr;
-        return error;
-    });
-    if (grouped <= 0) {
-        return grouped;
-    }
-    return account.pw_gid == administrators.gr_gid || Lists(administrators.gr_mem, user) ? 1 : 0;
+    return held->second.empty();
 }
 
 }  // namespace
 
-extern "C" int TLIBGroupIsAdminGroupMem(const char* user, int) {
+extern "C" {
+
+int TLIBGroupIsAdminGroupMem(const char* user, int) {
     if (user == nullptr || *user == '\0') {
         return 0;
     }
-    try {
-        return IsAdministrator(user);
-    } catch (const std::bad_alloc&) {
-        return -1;
-    }
+    return host::NoThrow(-1, [&] { return IsAdministrator(user); });
 }
+
+int TLIBAppPrivUserHas(const char* user, const char* privilege, const char* remoteIP) {
+    if (user == nullptr || *user == '\0' || privilege == nullptr || *privilege == '\0') {
+        return 0;
+    }
+    return host::NoThrow(0, [&] {
+        if (IsAdministrator(user) == 1) {
+            return 1;
+        }
+        talo::Account account;
+        return host::FindAccountOf(user, &account) == host::Lookup::kFound &&
+                       HoldsFrom(account, privilege, remoteIP != nullptr ? remoteIP : "")
+                   ? 1
+                   : 0;
+    });
+}
+
+}  // extern "C"

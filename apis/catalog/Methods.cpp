@@ -1,0 +1,107 @@
+#include <cstdlib>
+
+#include "Catalog.h"
+#include "webapi/APIRequest.h"
+#include "webapi/APIResponse.h"
+#include "webapi/APIRunner.h"
+
+using TALO::APIRequest;
+using TALO::APIResponse;
+using TALO::APIRunner;
+
+namespace {
+
+// An entry of a version's list names a method as a text, or as the members of
+// an object.
+std::vector<std::string> NamesOf(const Json::Value& entry) {
+    if (entry.isString()) {
+        return {entry.asString()};
+    }
+    return entry.isObject() ? entry.getMemberNames() : std::vector<std::string>();
+}
+
+Json::Value MethodsOf(APIRunner& runner, const std::string& name, int version,
+                      const Json::Value& entries, const Json::Value& docs) {
+    Json::Value methods(Json::objectValue);
+    for (Json::ArrayIndex index = 0; entries.isArray() && index < entries.size(); ++index) {
+        for (const std::string& method : NamesOf(entries[index])) {
+            const Json::Value& attributes = runner.GetMethod(name, version, method);
+            Json::Value& shown = methods[method];
+            shown["attributes"] =
+                attributes.isObject() ? attributes : Json::Value(Json::objectValue);
+            if (docs.isObject() && docs[method].isObject()) {
+                shown["doc"] = docs[method];
+            }
+        }
+    }
+    return methods;
+}
+
+bool IsOffered(const Json::Value& description, int version) {
+    return version >= description["minVersion"].asInt() &&
+           version <= description["maxVersion"].asInt();
+}
+
+// The decimal text of a version that can be called, else 0.
+int VersionOf(const std::string& text) {
+    const int version = std::atoi(text.c_str());
+    return version > 0 && std::to_string(version) == text ? version : 0;
+}
+
+}  // namespace
+
+Json::Value Entry(APIRunner& runner, const std::string& name, const Json::Value& description) {
+    const Json::Value& doc = description["doc"];
+    Json::Value entry(Json::objectValue);
+    entry["name"] = name;
+    entry["min_version"] = description["minVersion"];
+    entry["max_version"] = description["maxVersion"];
+    entry["auth_level"] = description["authLevel"];
+    if (doc.isObject() && doc["summary"].isString()) {
+        entry["summary"] = doc["summary"];
+    }
+    const Json::Value& docs = doc.isObject() ? doc["methods"] : Json::Value::nullSingleton();
+    entry["versions"] = Json::Value(Json::objectValue);
+    const Json::Value& methods = description["methods"];
+    for (auto list = methods.begin(); list != methods.end(); ++list) {
+        const int version = VersionOf(list.name());
+        if (version > 0 && IsOffered(description, version)) {
+            entry["versions"][list.name()] = MethodsOf(runner, name, version, *list, docs);
+        }
+    }
+    return entry;
+}
+
+void List(APIRequest* request, APIResponse* response) {
+    APIRunner runner;
+    Json::Value descriptions(Json::objectValue);
+    (void)runner.InitLibDesc(descriptions);
+    const Json::Value& known = descriptions;
+    Json::Value apis(Json::arrayValue);
+    for (auto description = known.begin(); description != known.end(); ++description) {
+        if (MayCall(*request, *description)) {
+            apis.append(Entry(runner, description.name(), *description));
+        }
+    }
+    Json::Value data(Json::objectValue);
+    data["apis"] = apis;
+    response->SetSuccess(data);
+}
+
+// An API that the caller may not call is as unknown as one that is not there.
+void Describe(APIRequest* request, APIResponse* response) {
+    const auto name = request->GetAndCheckString("name", APIRequest::REQUIRED, nullptr);
+    if (name.IsInvalid()) {
+        response->SetError(kBadParameter, "name");
+        return;
+    }
+    APIRunner runner;
+    Json::Value descriptions(Json::objectValue);
+    const bool loaded = runner.InitLibDesc(descriptions, name.Get()) != 0;
+    const Json::Value& known = descriptions;
+    if (!loaded || !known.isMember(name.Get()) || !MayCall(*request, known[name.Get()])) {
+        response->SetError(kNoSuchAPI, name.Get());
+        return;
+    }
+    response->SetSuccess(Entry(runner, name.Get(), known[name.Get()]));
+}

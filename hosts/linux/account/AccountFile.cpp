@@ -1,0 +1,292 @@
+#include "hosts/linux/account/AccountFile.h"
+
+#include <errno.h>
+#include <fcntl.h>
+#include <string.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <limits>
+#include <set>
+
+#include "hosts/linux/util/Descriptor.h"
+#include "hosts/linux/util/HostLog.h"
+#include "hosts/linux/util/SmallFile.h"
+#include "platform/System.h"
+
+namespace host {
+
+namespace {
+
+constexpr char kSource[] = "AccountFile.cpp";
+constexpr unsigned kLastUid = std::numeric_limits<int>::max();
+
+bool Refuse(std::string* problem, const std::string& text) {
+    *problem = text;
+    return false;
+}
+
+// Whoever can write the file can make himself an administrator.
+bool IsTrusted(int file, std::string* reason) {
+    struct stat facts = {};
+    if (fstat(file, &facts) != 0) {
+        return Refuse(reason, strerror(errno));
+    }
+    if (facts.st_uid != 0 && facts.st_uid != geteuid()) {
+        return Refuse(reason, "it belongs to another user");
+    }
+    if ((facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
+        return Refuse(reason, "others than its owner may write it");
+    }
+    return true;
+}
+
+bool ReadAccounts(const std::string& path, std::string* content) {
+    const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOFOLLOW));
+    if (file.Get() < 0 && errno == ENOENT) {
+        content->clear();
+        return true;
+    }
+    std::string reason = file.Get() < 0 ? strerror(errno) : "";
+    if (file.Get() >= 0 && IsTrusted(file.Get(), &reason) &&
+        ReadSmallFile(file.Get(), kMaxAccountsBytes, content, &reason)) {
+        return true;
+    }
+    HOST_LOG("cannot use %s: %s", path.c_str(), reason.c_str());
+    return false;
+}
+
+// Calls `visit` with the number and the bytes of each line, blank ones left
+// out, until it answers false.
+template <typename Visit>
+void ForEachLine(const std::string& content, Visit visit) {
+    size_t number = 0;
+    for (size_t start = 0; start < content.size();) {
+        const size_t end = std::min(content.find('\n', start), content.size());
+        ++number;
+        if (content.find_first_not_of(" \t\r", start) < end && !visit(number, start, end)) {
+            return;
+        }
+        start = end + 1;
+    }
+}
+
+bool Understand(const std::string& path, const std::string& content, size_t number, size_t start,
+                size_t end, StoredAccount* stored, Json::Value* members = nullptr) {
+    std::string reason;
+    if (ParseAccountLine(content.data() + start, content.data() + end, stored, members, &reason)) {
+        return true;
+    }
+    HOST_LOG("%s: line %zu is skipped: %s", path.c_str(), number, reason.c_str());
+    return false;
+}
+
+// Spares the parsing of all the other accounts: a line that has the name has it
+// in quotes, or has an escape that may stand for a part of it.
+bool MayName(const std::string& content, size_t start, size_t end, const std::string& quoted) {
+    const char* begin = content.data() + start;
+    return memmem(begin, end - start, quoted.data(), quoted.size()) != nullptr ||
+           memchr(begin, '\\', end - start) != nullptr;
+}
+
+struct Place {
+    size_t start;
+    size_t end;  // of the text, without the line's end
+};
+
+// All lines of one account: the first counts, but all go when it goes.
+std::vector<Place> PlacesOf(const std::string& path, const std::string& content,
+                            const std::string& name) {
+    std::vector<Place> places;
+    ForEachLine(content, [&](size_t number, size_t start, size_t end) {
+        StoredAccount read;
+        if (MayName(content, start, end, '"' + name + '"') &&
+            Understand(path, content, number, start, end, &read) && read.account.name == name) {
+            places.push_back({start, end});
+        }
+        return true;
+    });
+    return places;
+}
+
+// The one behind the highest: a removed account's files must not fall to the
+// next one as long as there are other numbers.
+bool NextUid(const std::string& path, const std::string& content, unsigned* uid) {
+    std::set<unsigned> taken;
+    ForEachLine(content, [&](size_t number, size_t start, size_t end) {
+        StoredAccount read;
+        if (Understand(path, content, number, start, end, &read)) {
+            taken.insert(read.account.uid);
+        }
+        return true;
+    });
+    if (taken.empty() || *taken.rbegin() < kLastUid) {
+        *uid = taken.empty() ? kFirstUid : std::max(*taken.rbegin() + 1, kFirstUid);
+        return true;
+    }
+    unsigned candidate = kFirstUid;
+    while (candidate < kLastUid && taken.count(candidate) != 0) {
+        ++candidate;
+    }
+    *uid = candidate;
+    return candidate < kLastUid;
+}
+
+int OpenLock(const std::string& path) {
+    const int file = open((path + ".lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW,
+                          S_IRUSR | S_IWUSR);
+    if (file < 0) {
+        return -1;
+    }
+    while (flock(file, LOCK_EX) != 0) {
+        if (errno != EINTR) {
+            (void)close(file);
+            return -1;
+        }
+    }
+    return file;
+}
+
+using ContentChange = std::function<bool(std::string* content, std::string* problem)>;
+
+bool Edit(const std::string& path, const ContentChange& change, std::string* problem) {
+    if (TALOFSMkdirP(path.substr(0, path.rfind('/')).c_str(), 0, 1, -1, -1, 0755) < 0) {
+        return Refuse(problem, "cannot make the folder of " + path + ": " + strerror(errno));
+    }
+    const Descriptor lock(OpenLock(path));
+    if (lock.Get() < 0) {
+        return Refuse(problem, "cannot lock " + path + ": " + strerror(errno));
+    }
+    std::string content;
+    if (!ReadAccounts(path, &content)) {
+        return Refuse(problem, "cannot use " + path + "; the system log says why");
+    }
+    if (!change(&content, problem)) {
+        return false;
+    }
+    if (content.size() > kMaxAccountsBytes) {
+        return Refuse(problem, "the file of accounts is full");
+    }
+    if (!ReplaceFile(path, content)) {
+        return Refuse(problem, "cannot write " + path + ": " + strerror(errno));
+    }
+    return true;
+}
+
+}  // namespace
+
+Lookup FindInFile(const std::string& path, const std::string& name, StoredAccount* stored) {
+    std::string content;
+    if (!ReadAccounts(path, &content)) {
+        return Lookup::kUnavailable;
+    }
+    Lookup result = Lookup::kAbsent;
+    const std::string quoted = '"' + name + '"';
+    ForEachLine(content, [&](size_t number, size_t start, size_t end) {
+        StoredAccount read;
+        if (MayName(content, start, end, quoted) &&
+            Understand(path, content, number, start, end, &read) && read.account.name == name) {
+            *stored = std::move(read);
+            result = Lookup::kFound;
+        }
+        return result == Lookup::kAbsent;
+    });
+    return result;
+}
+
+bool ListFile(const std::string& path, std::vector<talo::Account>* accounts) {
+    std::string content;
+    if (!ReadAccounts(path, &content)) {
+        return false;
+    }
+    std::map<std::string, talo::Account> byName;
+    ForEachLine(content, [&](size_t number, size_t start, size_t end) {
+        StoredAccount read;
+        if (Understand(path, content, number, start, end, &read) &&
+            !byName.emplace(read.account.name, read.account).second) {
+            HOST_LOG("%s: line %zu is skipped: its name has an earlier line", path.c_str(), number);
+        }
+        return true;
+    });
+    std::vector<talo::Account> listed;
+    for (auto& entry : byName) {
+        listed.push_back(std::move(entry.second));
+    }
+    accounts->swap(listed);
+    return true;
+}
+
+bool AppendToFile(const std::string& path, const std::string& name, const std::string& hash,
+                  std::string* problem) {
+    return Edit(
+        path,
+        [&](std::string* content, std::string* why) {
+            if (!PlacesOf(path, *content, name).empty()) {
+                return Refuse(why, "the account \"" + name + "\" exists");
+            }
+            unsigned uid = 0;
+            if (!NextUid(path, *content, &uid)) {
+                return Refuse(why, "no uid is free");
+            }
+            Json::Value members(Json::objectValue);
+            members[kNameMember] = name;
+            members[kUidMember] = uid;
+            members[kHashMember] = hash;
+            if (!content->empty() && content->back() != '\n') {
+                *content += '\n';
+            }
+            *content += RenderAccountLine(members) + '\n';
+            return true;
+        },
+        problem);
+}
+
+bool RemoveFromFile(const std::string& path, const std::string& name, std::string* problem) {
+    return Edit(
+        path,
+        [&](std::string* content, std::string* why) {
+            const std::vector<Place> places = PlacesOf(path, *content, name);
+            if (places.empty()) {
+                return Refuse(why, "there is no account \"" + name + "\"");
+            }
+            for (auto place = places.rbegin(); place != places.rend(); ++place) {
+                content->erase(place->start, place->end + 1 - place->start);
+            }
+            return true;
+        },
+        problem);
+}
+
+bool ChangeInFile(const std::string& path, const std::string& name, const MemberChange& change,
+                  std::string* problem) {
+    return Edit(
+        path,
+        [&](std::string* content, std::string* why) {
+            const std::vector<Place> places = PlacesOf(path, *content, name);
+            if (places.empty()) {
+                return Refuse(why, "there is no account \"" + name + "\"");
+            }
+            const Place place = places.front();
+            StoredAccount read;
+            Json::Value members;
+            std::string reason;
+            if (!ParseAccountLine(content->data() + place.start, content->data() + place.end, &read,
+                                  &members, &reason) ||
+                !change(&members, why)) {
+                return false;
+            }
+            // What would be skipped afterwards must not be written.
+            const std::string line = RenderAccountLine(members);
+            if (!ParseAccountLine(line.data(), line.data() + line.size(), &read, nullptr,
+                                  &reason)) {
+                return Refuse(why, reason);
+            }
+            content->replace(place.start, place.end - place.start, line);
+            return true;
+        },
+        problem);
+}
+
+}  // namespace host
