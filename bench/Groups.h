@@ -5,6 +5,7 @@ namespace bench {
 
 void JsonText();      // the serialiser against the library's writers
 void Requests();      // parameter lines, description look-up, a call in-process
+void Sessions();      // a session check, and the elements of a compound request
 void ProcessStart();  // a whole entry.cgi process against a bare program
 
 }  // namespace bench

@@ -39,8 +39,8 @@ void Compare(const std::string& title, const std::vector<Subject>& subjects, int
     const double first = Median(times[0]);
     for (size_t index = 0; index < subjects.size(); ++index) {
         const double median = Median(times[index]);
-        std::printf("  %-44s %10.2f us  %6.2f\n", subjects[index].name.c_str(), median,
-                    median / first);
+        std::printf("  %-44s %10.2f us  %6.2f  %+10.2f us\n", subjects[index].name.c_str(), median,
+                    median / first, median - first);
     }
     std::printf("\n");
 }

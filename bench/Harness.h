@@ -14,7 +14,8 @@ struct Subject {
 
 // Times the subjects alternately, round by round, so that whatever else the
 // machine does falls on all of them, and prints a row for each: the median time
-// of one run and its ratio to the first subject's.
+// of one run with its ratio and its difference to the
+// first subject's.
 void Compare(const std::string& title, const std::vector<Subject>& subjects, int rounds,
              int runsPerRound);
 

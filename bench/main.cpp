@@ -14,6 +14,7 @@ const Group kGroups[] = {
     {"json", bench::JsonText},
     {"requests", bench::Requests},
     {"process", bench::ProcessStart},
+    {"sessions", bench::Sessions},
 };
 
 bool Wanted(const char* name, int argc, char** argv) {
@@ -30,7 +31,8 @@ bool Wanted(const char* name, int argc, char** argv) {
 // The groups to run are named on the command line; all without.
 int main(int argc, char** argv) {
     std::printf(
-        "Medians of one interleaved run; the last column is the ratio to the first row.\n\n");
+        "Medians of one interleaved run; the last columns are the ratio and the "
+        "difference to the first row.\n\n");
     for (const Group& group : kGroups) {
         if (Wanted(group.name, argc, argv)) {
             group.run();

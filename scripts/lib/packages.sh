@@ -4,7 +4,7 @@
 # shellcheck disable=SC2154  # project is set by common.sh
 
 # shellcheck disable=SC2034  # used by the scripts that read this file
-packages_build=(g++ cmake ninja-build libjsoncpp-dev)
+packages_build=(g++ cmake ninja-build libjsoncpp-dev libcrypt-dev)
 # shellcheck disable=SC2034
 packages_test=(ccache libgtest-dev libgmock-dev python3 git curl pkg-config util-linux
     lighttpd nginx fcgiwrap apache2-bin)

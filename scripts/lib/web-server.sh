@@ -145,8 +145,9 @@ show_examples() {
 
 Try, in another terminal:
   curl '$entry?api=TALO.System&version=1&method=ping&text=hi'
-  curl -d 'api=TALO.System&version=1&method=ping&count=3' $entry
-  curl -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
+  curl -c jar -d 'api=TALO.Session&version=1&method=open&account=admin' \\
+      --data-urlencode 'passwd="PASSWORD"' $entry
+  curl -b jar -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
 END
 }
 
