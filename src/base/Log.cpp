@@ -34,7 +34,8 @@ std::string EscapeControls(const char* text) {
 }
 
 // Builds the line, with its place unless `source` is null, and hands it over.
-__attribute__((format(printf, 4, 0))) void Finish(int priority, const char* source, int line, const char* format, va_list arguments) {
+__attribute__((format(printf, 4, 0))) void Finish(int priority, const char* source, int line,
+                                                  const char* format, va_list arguments) {
     const int keptErrno = errno;
     char message[kMaxLine];
     int prefix =

@@ -13,11 +13,11 @@ namespace talo {
 
 struct Session {
     std::string user;
-    std::string address;      // of the client that logged in
-    std::string language;     // "" for the default
-    std::string application;  // "" for the administration interface
-    std::string privilege;    // web-API privilege text
-    int timeout = 0;          // minutes without use, 0 for the appliance's default
+    std::string address;       // of the client that logged in
+    std::string language;      // "" for the default
+    std::string application;   // "" for the administration interface
+    std::string privilege;     // web-API privilege text
+    int timeout = 0;           // minutes without use, 0 for the appliance's default
     bool skipAddress = false;  // not bound to the address
     std::string handle;        // names the session to others than its owner; no secret
     long long created = 0;     // seconds since the epoch
