@@ -28,7 +28,7 @@ std::map<std::string, std::string> HostCookies(const std::string& header) {
     ctx.state = &state;
     (void)setenv("HTTP_COOKIE", header.c_str(), 1);
     Require(TaloCgiLoadInCookies(&ctx) == 0);
-    const auto first = state.cookies;
+    auto first = state.cookies;
     Require(TaloCgiLoadInCookies(&ctx) == 0 && state.cookies == first);
     return first;
 }
@@ -37,7 +37,8 @@ std::map<std::string, std::string> HostCookies(const std::string& header) {
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     // A variable of the environment ends at NUL.
-    const std::string header = std::string(reinterpret_cast<const char*>(data), size).c_str();
+    const std::string bytes(reinterpret_cast<const char*>(data), size);
+    const std::string header = bytes.substr(0, bytes.find('\0'));
     Json::Value document;
     document["environ"]["HTTP_COOKIE"] = header;
     const TALO::APIRequest request(document);

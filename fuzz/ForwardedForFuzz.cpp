@@ -18,7 +18,7 @@ void Require(bool condition) {
 
 std::string TakeLine(std::string* text) {
     const size_t end = text->find('\n');
-    const std::string line = text->substr(0, end);
+    std::string line = text->substr(0, end);
     *text = end == std::string::npos ? "" : text->substr(end + 1);
     return line;
 }

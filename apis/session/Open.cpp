@@ -16,7 +16,7 @@ namespace {
 
 // How long a remembered session may go unused.
 constexpr int kRememberedMinutes = 7 * 24 * 60;
-constexpr int kSecondsPerMinute = 60;
+constexpr int kRememberedSeconds = kRememberedMinutes * 60;
 
 // The framework's own code for what is not permitted.
 constexpr int kNotPermitted = 105;
@@ -53,7 +53,7 @@ std::string Expires(const APIRequest& request) {
     if (now < 0 || now > kLatest) {
         return std::string();
     }
-    const time_t when = static_cast<time_t>(now) + kRememberedMinutes * kSecondsPerMinute;
+    const time_t when = static_cast<time_t>(now) + kRememberedSeconds;
     struct tm parts = {};
     char text[64] = {};
     if (gmtime_r(&when, &parts) == nullptr ||
@@ -67,8 +67,7 @@ std::string Expires(const APIRequest& request) {
 std::string CookieLine(const APIRequest& request, const std::string& id, bool remember) {
     std::string line = "id=" + id + "; Path=/; HttpOnly; SameSite=Strict";
     if (remember) {
-        line += "; Max-Age=" + std::to_string(kRememberedMinutes * kSecondsPerMinute) +
-                Expires(request);
+        line += "; Max-Age=" + std::to_string(kRememberedSeconds) + Expires(request);
     }
     return request.GetURLProto("") == "https" ? line + "; Secure" : line;
 }

@@ -37,7 +37,7 @@ const char kUsage[] =
     "\n"
     "Exit status: 0 success, 1 it could not be done, 2 wrong usage.\n";
 
-constexpr long long kSecondsPerDay = 24 * 3600;
+constexpr long long kSecondsPerDay = 24LL * 3600;
 
 bool GetPassword(const Arguments& arguments, std::string* password, std::string* problem) {
     return arguments.generate ? GeneratePassword(password, problem)

@@ -20,6 +20,7 @@ using support::Parse;
 // The entry with its request and response in sight.
 class OpenEntry : public TALO::WebEntry {
   public:
+    virtual ~OpenEntry() = default;
     using TALO::WebEntry::CheckPermission;
     using TALO::WebEntry::request;
     using TALO::WebEntry::response;

@@ -8,7 +8,6 @@
 
 namespace {
 
-using support::Parse;
 using TALO::APIAuth;
 using TALO::APIRequest;
 

@@ -211,6 +211,7 @@ bool ListFile(const std::string& path, std::vector<talo::Account>* accounts) {
         return true;
     });
     std::vector<talo::Account> listed;
+    listed.reserve(byName.size());
     for (auto& entry : byName) {
         listed.push_back(std::move(entry.second));
     }

@@ -15,7 +15,7 @@ namespace host {
 namespace {
 
 constexpr char kSource[] = "Login.cpp";
-constexpr long long kSecondsPerDay = 24 * 3600;
+constexpr long long kSecondsPerDay = 24LL * 3600;
 
 // What is known about a name before its password is looked at.
 struct Candidate {

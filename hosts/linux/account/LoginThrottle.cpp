@@ -37,7 +37,7 @@ std::string BucketPath(const std::string& dir, const char* kind, const std::stri
 
 // Who has an IPv6 address has its /64.
 std::string AddressKey(const std::string& address) {
-    const std::string canonical = CanonicalAddress(address);
+    std::string canonical = CanonicalAddress(address);
     unsigned char bytes[16];
     char text[INET6_ADDRSTRLEN];
     if (inet_pton(AF_INET6, canonical.c_str(), bytes) != 1) {

@@ -16,9 +16,9 @@ constexpr unsigned kKeysPerBucket = 32;
 // The first failures cost nothing; each further one doubles the wait.
 constexpr unsigned kFreeFailures = 5;
 constexpr long long kFirstWaitMs = 1000;
-constexpr long long kLongestWaitMs = 300 * 1000;
+constexpr long long kLongestWaitMs = 300LL * 1000;
 // A counter without a failure for that long begins anew.
-constexpr long long kForgetMs = 3600 * 1000;
+constexpr long long kForgetMs = 3600LL * 1000;
 
 // How long after its last failure a key has to wait.
 long long WaitAfter(unsigned failures);

@@ -151,6 +151,7 @@ bool ListSystem(std::vector<talo::Account>* accounts) {
         return false;
     }
     std::vector<talo::Account> listed;
+    listed.reserve(byName.size());
     for (auto& entry : byName) {
         listed.push_back(std::move(entry.second));
     }

@@ -36,7 +36,7 @@ constexpr size_t kHandleBytes = 9;
 constexpr char kAlphabet[] = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-_";
 
 // A record is some hundred bytes; what is larger is none of ours.
-constexpr size_t kMaxRecordBytes = 16 * 1024;
+constexpr size_t kMaxRecordBytes = size_t{16} * 1024;
 
 // The letter and that many random bytes in URL-safe base64. "" when the kernel
 // has none to give.

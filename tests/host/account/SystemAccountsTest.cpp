@@ -17,7 +17,6 @@
 namespace {
 
 using talo::LoginResult;
-using ::testing::Contains;
 using ::testing::UnorderedElementsAre;
 
 struct ShadowRow {

@@ -19,6 +19,8 @@ namespace fs = std::filesystem;
 
 namespace {
 
+constexpr char kAccountsLock[] = TALO_ACCOUNTS_FILE ".lock";
+
 constexpr const char* kVariables[] = {"REMOTE_ADDR", "HTTP_X_FORWARDED_FOR",
                                       "HTTP_ORIGIN", "HTTP_SEC_FETCH_SITE",
                                       "HTTP_HOST",   "HTTP_COOKIE"};
@@ -27,8 +29,8 @@ void Clear() {
     for (const char* variable : kVariables) {
         (void)unsetenv(variable);
     }
-    for (const char* path : {TALO_SESSION_DIR, TALO_THROTTLE_DIR, TALO_ACCOUNTS_FILE,
-                             TALO_ACCOUNTS_FILE ".lock", TALO_HOST_CONF}) {
+    for (const char* path :
+         {TALO_SESSION_DIR, TALO_THROTTLE_DIR, TALO_ACCOUNTS_FILE, kAccountsLock, TALO_HOST_CONF}) {
         fs::remove_all(path);
     }
 }
