@@ -87,6 +87,13 @@ bool ReadSession(const std::string& id, talo::Session* session) {
     return true;
 }
 
+bool IsSameFolder(const char* place, const char* name) {
+    struct stat wanted = {};
+    struct stat known = {};
+    return stat(place, &wanted) == 0 && lstat(name, &known) == 0 && wanted.st_dev == known.st_dev &&
+           wanted.st_ino == known.st_ino;
+}
+
 // Calls `visit` with the name of every entry of the folder.
 template <typename Visit>
 void ForEachName(Visit visit) {
@@ -112,13 +119,20 @@ void RemoveLeftover(const std::string& name, long long now) {
 
 }  // namespace
 
+// To resolve the place costs a call per folder of its path, so it is kept as
+// long as the name found still leads to the same folder.
 std::string SessionDir() {
+    static std::string found;
     const std::string dir = TALO_SESSION_DIR;
+    if (!found.empty() && IsSameFolder(dir.c_str(), found.c_str())) {
+        return found;
+    }
     std::unique_ptr<char, void (*)(void*)> resolved(realpath(dir.c_str(), nullptr), free);
     if (resolved == nullptr && TALOFSMkdirP(dir.c_str(), 0, 1, -1, -1, 0700) == 0) {
         resolved.reset(realpath(dir.c_str(), nullptr));
     }
-    return resolved != nullptr ? resolved.get() : dir;
+    found = resolved != nullptr ? resolved.get() : "";
+    return resolved != nullptr ? found : dir;
 }
 
 bool HasTimedOut(const talo::Session& session, int defaultMinutes, long long now) {
