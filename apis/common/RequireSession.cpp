@@ -47,7 +47,7 @@ bool RequireSession(APIRequest* request, APIResponse* response, SessionUse use) 
         return false;
     }
     if (use == SessionUse::kRenew) {
-        (void)TALO::APIAuth::UpdateTimeout(request);
+        (void)talo::RenewSession(id);
     }
     return true;
 }

@@ -4,6 +4,7 @@
 #include <errno.h>
 #include <fcntl.h>
 #include <stdlib.h>
+#include <string.h>
 #include <sys/random.h>
 #include <sys/stat.h>
 #include <time.h>
@@ -87,11 +88,17 @@ bool ReadSession(const std::string& id, talo::Session* session) {
     return true;
 }
 
+// Whether a name that was found earlier still is the place, without links. Where
+// it is the place itself, it has only to be a folder.
 bool IsSameFolder(const char* place, const char* name) {
     struct stat wanted = {};
     struct stat known = {};
-    return stat(place, &wanted) == 0 && lstat(name, &known) == 0 && wanted.st_dev == known.st_dev &&
-           wanted.st_ino == known.st_ino;
+    if (lstat(name, &known) != 0 || !S_ISDIR(known.st_mode)) {
+        return false;
+    }
+    return strcmp(place, name) == 0 ||
+           (stat(place, &wanted) == 0 && wanted.st_dev == known.st_dev &&
+            wanted.st_ino == known.st_ino);
 }
 
 // Calls `visit` with the name of every entry of the folder.
