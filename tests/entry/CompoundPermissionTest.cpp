@@ -102,6 +102,13 @@ TEST_F(CompoundPermission, HandsNoFactsToAnElementBeforeItsCheck) {
     EXPECT_EQ(Checks(), 0u);
 }
 
+TEST_F(CompoundPermission, LeavesNoFactsToAnElementThatIsNotChecked) {
+    const Json::Value data = Data(List({Element("Test.Rights"), Element("Test.Rights.Open")}));
+    EXPECT_EQ(data["result"][0]["data"]["user"], Json::Value("ann"));
+    EXPECT_EQ(data["result"][1]["data"]["user"], Json::Value(""));
+    EXPECT_EQ(data["result"][1]["data"]["authorized"], Json::Value(false));
+}
+
 TEST_F(CompoundPermission, WithoutALoginIs119ForEachElementThatNeedsOne) {
     const Json::Value data = Data(List({Element("Test.Rights"), Element("Test.Rights.Open"),
                                         Element("Test.Rights.Optional"), Element("Test.Rights")}),

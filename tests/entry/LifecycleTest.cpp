@@ -1,8 +1,7 @@
-#include <cstring>
-
 #include "tests/entry/EntryTest.h"
 #include "tests/support/Json.h"
 #include "tests/support/PrivateMember.h"
+#include "tests/support/Slots.h"
 
 namespace support {
 
@@ -21,17 +20,9 @@ template struct PrivateMember<PermissionCache, &TALO::WebEntry::permissionCache>
 }  // namespace support
 
 using support::Parse;
+using support::SlotOf;
 
 namespace {
-
-// The place of a virtual operation in its class's table. In the ABI's member
-// pointer the offset's lowest bit, or another word, says that it is virtual.
-template <typename Member>
-size_t Slot(Member member) {
-    size_t word = 0;
-    std::memcpy(&word, &member, sizeof word);
-    return (word & ~size_t(1)) / sizeof(void*);
-}
 
 class Widened : public TALO::WebEntry {
   public:
@@ -41,15 +32,15 @@ class Widened : public TALO::WebEntry {
 class WebEntryLife : public EntryTest {};
 
 TEST_F(WebEntryLife, OverridesTheSixSlotsOfTheRunnerAndAddsNone) {
-    EXPECT_EQ(Slot(&TALO::WebEntry::Run), 0u);
-    EXPECT_EQ(Slot(&TALO::WebEntry::Initialize), 1u);
-    EXPECT_EQ(Slot(&TALO::WebEntry::NeedPermission), 2u);
-    EXPECT_EQ(Slot(static_cast<bool (TALO::WebEntry::*)(TALO::APIRequest*, TALO::APIResponse*)>(
+    EXPECT_EQ(SlotOf(&TALO::WebEntry::Run), 0);
+    EXPECT_EQ(SlotOf(&TALO::WebEntry::Initialize), 1);
+    EXPECT_EQ(SlotOf(&TALO::WebEntry::NeedPermission), 2);
+    EXPECT_EQ(SlotOf(static_cast<bool (TALO::WebEntry::*)(TALO::APIRequest*, TALO::APIResponse*)>(
                   &TALO::WebEntry::CheckPermission)),
-              3u);
-    EXPECT_EQ(Slot(&TALO::WebEntry::HandleUpload), 4u);
-    EXPECT_EQ(Slot(&TALO::WebEntry::SkipPermission), 5u);
-    EXPECT_EQ(Slot(&Widened::Next), 6u);
+              3);
+    EXPECT_EQ(SlotOf(&TALO::WebEntry::HandleUpload), 4);
+    EXPECT_EQ(SlotOf(&TALO::WebEntry::SkipPermission), 5);
+    EXPECT_EQ(SlotOf(&Widened::Next), 6);
 }
 
 TEST_F(WebEntryLife, BeginsWithAnEmptyFileListAndAnEmptyListOfPermissionResults) {
@@ -84,7 +75,7 @@ TEST_F(WebEntryLife, ReleasesTheContextAndThenDeletesTheUploadedFiles) {
         EXPECT_EQ(fake::Now().journal, expected);
         const std::vector<std::string> paths = {"/tmp/one", "/tmp/gone", "/tmp/two"};
         EXPECT_EQ(fake::Now().unlinked, paths);
-        EXPECT_EQ(fake::Now().files.count("/tmp/one") + fake::Now().files.count("/tmp/two"), 0u);
+        EXPECT_EQ(fake::Now().files.count("/tmp/one") + fake::Now().files.count("/tmp/two"), 0);
         EXPECT_EQ(fake::Now().openContexts, 0);
         return 0;
     });
