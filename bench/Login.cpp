@@ -1,49 +1,14 @@
 #include <cstdio>
 #include <string>
 
+#include "BenchLogin.h"
 #include "Groups.h"
 #include "Harness.h"
 #include "Spawn.h"
-#include "hosts/linux/sdk/Accounts.h"
-#include "hosts/linux/sdk/Sessions.h"
 
 namespace bench {
 
 namespace {
-
-const char kUser[] = "bench";
-
-// An account and a session for the run; both go at its end.
-class Login {
-  public:
-    Login() {
-        std::string problem;
-        if (!talo::AddAccount(kUser, "a password of the bench", &problem)) {
-            std::fprintf(stderr, "%s\n", problem.c_str());
-        }
-        talo::Session session;
-        session.user = kUser;
-        session.address = "127.0.0.1";
-        ready_ = talo::CreateSession(session, &id_);
-    }
-    ~Login() {
-        std::string problem;
-        (void)talo::EndSession(id_);
-        (void)talo::RemoveAccount(kUser, &problem);
-    }
-    Login(const Login&) = delete;
-    Login& operator=(const Login&) = delete;
-    bool IsReady() const {
-        return ready_;
-    }
-    const std::string& Id() const {
-        return id_;
-    }
-
-  private:
-    std::string id_;
-    bool ready_ = false;
-};
 
 std::string Compound(int elements) {
     std::string query = "api=TALO.Entry.Request&version=1&method=request&compound=[";

@@ -12,28 +12,68 @@
 
 namespace bench {
 
+namespace {
+
+[[noreturn]] void GiveUp(const std::string& program) {
+    std::fprintf(stderr, "%s did not run\n", program.c_str());
+    std::exit(1);
+}
+
+// With its standard output as `actions` have it.
+pid_t Spawn(const std::string& program, std::vector<std::string>* environment,
+            posix_spawn_file_actions_t* actions) {
+    posix_spawn_file_actions_addopen(actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+    std::string name = program;
+    char* arguments[] = {&name[0], nullptr};
+    std::vector<char*> variables;
+    for (std::string& variable : *environment) {
+        variables.push_back(&variable[0]);
+    }
+    variables.push_back(nullptr);
+    pid_t child = -1;
+    if (posix_spawn(&child, program.c_str(), actions, nullptr, arguments, variables.data()) != 0) {
+        GiveUp(program);
+    }
+    posix_spawn_file_actions_destroy(actions);
+    return child;
+}
+
+void Await(const std::string& program, pid_t child) {
+    int status = -1;
+    if (waitpid(child, &status, 0) != child || status != 0) {
+        GiveUp(program);
+    }
+}
+
+}  // namespace
+
 const char kEntry[] = TALO_WEBAPI_DIR "entry.cgi";
 
 void RunProcess(const std::string& program, std::vector<std::string> environment) {
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
     posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
-    std::string name = program;
-    char* arguments[] = {&name[0], nullptr};
-    std::vector<char*> variables;
-    for (std::string& variable : environment) {
-        variables.push_back(&variable[0]);
+    Await(program, Spawn(program, &environment, &actions));
+}
+
+std::string ReplyOf(const std::string& program, std::vector<std::string> environment) {
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC) != 0) {
+        GiveUp(program);
     }
-    variables.push_back(nullptr);
-    pid_t child = -1;
-    int status = -1;
-    if (posix_spawn(&child, program.c_str(), &actions, nullptr, arguments, variables.data()) != 0 ||
-        waitpid(child, &status, 0) != child || status != 0) {
-        std::fprintf(stderr, "%s did not run\n", program.c_str());
-        std::exit(1);
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_adddup2(&actions, ends[1], STDOUT_FILENO);
+    const pid_t child = Spawn(program, &environment, &actions);
+    (void)close(ends[1]);
+    std::string reply;
+    char block[4096];
+    for (ssize_t got = 0; (got = read(ends[0], block, sizeof block)) > 0;) {
+        reply.append(block, static_cast<size_t>(got));
     }
-    posix_spawn_file_actions_destroy(&actions);
+    (void)close(ends[0]);
+    Await(program, child);
+    return reply;
 }
 
 std::vector<std::string> Get(const std::string& query) {

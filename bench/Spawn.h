@@ -13,6 +13,9 @@ extern const char kEntry[];
 // thrown away. Ends the benchmark when it fails.
 void RunProcess(const std::string& program, std::vector<std::string> environment);
 
+// The same with its output kept.
+std::string ReplyOf(const std::string& program, std::vector<std::string> environment);
+
 // The CGI environment of a GET with that query, and of one under a session.
 std::vector<std::string> Get(const std::string& query);
 std::vector<std::string> Get(const std::string& query, const std::string& sessionId);

@@ -11,10 +11,10 @@ struct Group {
 };
 
 const Group kGroups[] = {
-    {"json", bench::JsonText},
-    {"requests", bench::Requests},
-    {"process", bench::ProcessStart},
-    {"sessions", bench::Sessions},
+    {"json", bench::JsonText},        {"requests", bench::Requests},
+    {"process", bench::ProcessStart}, {"upload", bench::Uploads},
+    {"sessions", bench::Sessions},    {"multipart", bench::Multipart},
+    {"downloads", bench::Downloads},  {"tasks", bench::Tasks},
 };
 
 bool Wanted(const char* name, int argc, char** argv) {

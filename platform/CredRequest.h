@@ -53,7 +53,8 @@ class TALO_PLATFORM CredRequestMgr {
 class TALO_PLATFORM CredRequestUtil {
   public:
     // Deciphers a text with the key that TALONdtokenGenerateToken derived. False
-    // when the text was not made with that key or was altered.
+    // when the text was not made with that key, was altered or cut, when the key
+    // is none, or the cipher cannot be had. `out` is then untouched.
     static bool GetDecryptAESString(const std::string& key, const std::string& text,
                                     std::string& out);
 };

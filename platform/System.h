@@ -34,7 +34,8 @@ TALO_PLATFORM int TLIBCSysUnlink(const char* path);
 TALO_PLATFORM int TLIBCFileUTime(const char* path, int now, long when);
 
 // Non-zero when the configuration file (key="value" a line) has `key` with
-// exactly `value`; `flags` is reserved and 0.
+// exactly `value`; the last line of a key counts. 0 also for a file that cannot
+// be read. `flags` is reserved and 0.
 TALO_PLATFORM int TLIBCFileCheckKeyValue(const char* file, const char* key, const char* value,
                                          int flags);
 
@@ -50,8 +51,12 @@ struct TALOVOLUME {
     unsigned long long freeBytes;
 };
 
-// The data volume with the most space that has `size` bytes free. 1 when there
-// is one (`volume` is filled), else 0 or negative. `status` says why not.
+// The data volume with the most space, if it has `size` bytes free for an
+// ordinary process. 1 when it has (`volume` is filled, the path without a final
+// slash), 0 when no volume has that much, negative when there is no volume at
+// all. `status` (may be null) gets 0, TALO_VOLUME_FULL or TALO_VOLUME_NONE.
+// `flags` is 1: only volumes that can be written to.
+enum { TALO_VOLUME_FULL = 1, TALO_VOLUME_NONE = 2 };
 TALO_PLATFORM int VolumeAvailGet(unsigned long long size, TALOVOLUME* volume, int* status,
                                  int flags);
 
@@ -62,21 +67,27 @@ TALO_PLATFORM int VolumeAvailGet(unsigned long long size, TALOVOLUME* volume, in
 TALO_PLATFORM void TLIBCStrCaseLower(char* text, size_t size);
 
 // A hash of texts, growing from `capacity` entries. Null when memory runs out.
+// Only the port puts entries into one: the operations that fill a hash replace
+// the value of a name that it has already. A port bounds the number of entries.
 struct TALOSZHASH;
 TALO_PLATFORM TALOSZHASH* TLIBCSzHashAlloc(int capacity);
+// Null is ignored by these two.
 TALO_PLATFORM void TLIBCSzHashFree(TALOSZHASH* hash);
 TALO_PLATFORM void TLIBCHashRemoveAll(TALOSZHASH* hash);
 
-// Walks a hash: the pair at or after `*position` (0 to begin), which advances;
-// 0 at the end. The texts live until the hash changes.
+// Walks a hash in the order in which its names first came: the pair at or after
+// `*position` (0 to begin), which advances; 0 at the end. The texts live until the hash changes.
 TALO_PLATFORM int TLIBCSzHashNext(const TALOSZHASH* hash, size_t* position, const char** key,
                                   const char** value);
 
 // --- Errors ---
 
-// Records the platform's error for the caller: 10496 no space, 3072 a folder
-// that cannot be made.
+// Records the platform's error for the caller, per thread: 10496 no space, 3072 a
+// folder that cannot be made.
 TALO_PLATFORM void TLIBCErrSet(int code);
+
+// The error recorded last by this thread, 0 for none.
+TALO_PLATFORM int TLIBCErrGet(void);
 
 // --- Users and groups ---
 
@@ -105,10 +116,16 @@ TALO_PLATFORM int TLIBNetService(int service, int action, int flags);
 
 // --- Names and addresses ---
 
-// The family of a textual address: 2 for IPv4, 10 for IPv6, 0 for neither.
+// The family of a textual address: 2 for IPv4, 10 for IPv6, 0 for neither. Full
+// forms only; an address with a zone id ("fe80::1%eth0") is neither.
 TALO_PLATFORM int TALONetGetAddrType(const char* text);
 
-// Non-zero for a valid domain name, or host name.
+// Non-zero for a valid domain name, or host name: ASCII letters, digits and "-",
+// labels of 1 to 63 without "-" at an end, at most 253 in all, the last label not
+// all digits. A name that is not ASCII is UTF-8 and tested as the DNS has it. A
+// domain name may end with one dot, which does not count for the length; a host
+// name may not, since it also goes where a dot is not understood (certificates,
+// the machine's own name).
 TALO_PLATFORM int BlTLIBIsDomain(const char* text);
 TALO_PLATFORM int BlTLIBIsHostname(const char* text);
 

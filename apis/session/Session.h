@@ -15,6 +15,7 @@ enum SessionError {
     kPasswordExpired = 404,  // the password was right
     kNoAccounts = 405,       // the accounts, or the sessions, cannot be used
     kNoSuchSession = 406,    // no session of that handle, or not the caller's to end
+    kNoCipher = 407,         // the appliance has no key, or no cipher
 };
 
 // Log in: "account", "passwd", optional "remember" (boolean) and "client_time"
@@ -31,8 +32,11 @@ void Info(TALO::APIRequest* request, TALO::APIResponse* response);
 void List(TALO::APIRequest* request, TALO::APIResponse* response);
 void End(TALO::APIRequest* request, TALO::APIResponse* response);
 
-// The check of every method but Open: the API as a whole needs no login, since
-// Open cannot have one.
+// What a client needs to encipher its parameters, the password of Open included.
+void Cipher(TALO::APIRequest* request, TALO::APIResponse* response);
+
+// The check of every method but Open and Cipher: the API as a whole needs no login,
+// since Open cannot have one.
 int CheckSession(TALO::APIRequest* request, TALO::APIResponse* response);
 
 #endif

@@ -9,10 +9,10 @@
 namespace {
 
 TALO::_tag_API_TABLE table[] = {
-    {"TALO.Session", 1, "open", Open},   {"TALO.Session", 1, "close", Close},
-    {"TALO.Session", 1, "renew", Renew}, {"TALO.Session", 1, "info", Info},
-    {"TALO.Session", 1, "list", List},   {"TALO.Session", 1, "end", End},
-    {nullptr, 0, nullptr, nullptr},
+    {"TALO.Session", 1, "open", Open},     {"TALO.Session", 1, "close", Close},
+    {"TALO.Session", 1, "renew", Renew},   {"TALO.Session", 1, "info", Info},
+    {"TALO.Session", 1, "list", List},     {"TALO.Session", 1, "end", End},
+    {"TALO.Session", 1, "cipher", Cipher}, {nullptr, 0, nullptr, nullptr},
 };
 
 // The terminating row checks every method.
@@ -24,7 +24,7 @@ TALO::_tag_API_CHECK_TABLE checkTable[] = {
 
 int CheckSession(TALO::APIRequest* request, TALO::APIResponse* response) {
     const std::string method = request->GetAPIMethod();
-    if (method == "open") {
+    if (method == "open" || method == "cipher") {
         return 1;
     }
     const SessionUse use = method == "close"  ? SessionUse::kEvenTimedOut

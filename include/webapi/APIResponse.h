@@ -57,6 +57,10 @@ class WEBAPI_EXPORT APIResponse {
     bool HasHeader(const std::string& name) const;
     Json::Value GetHeaders() const;
 
+    /// Takes a header line out, such as the "Content-type" that every response
+    /// begins with, where the content's own type follows. False when it is not there.
+    bool RemoveHeader(const std::string& name);
+
     /// A text for the client's log, sent as the header line "x-request-error".
     void SetServerError(const std::string& text);
     bool HasServerError() const;

@@ -56,6 +56,11 @@ class WEBAPI_EXPORT WebEntry : public APIRunner {
     bool InitGetParam(Json::Value& getParam);
     bool InitPostParam(Json::Value& postParam);
 
+    /// Reads the first three fields of an upload's body, which name the API where
+    /// the query does not. From then on the request's "CONTENT_LENGTH" is that of
+    /// the rest.
+    bool LoadUploadAPIDesc(Json::Value& postParam);
+
     /// Splits and decodes one parameter line into an object, carriers of
     /// enciphered parameters included.
     bool DetectAndDecryptParamLine(const std::string& line, Json::Value& params);

@@ -1,9 +1,12 @@
 #include <fcntl.h>
+#include <limits.h>
 #include <poll.h>
 #include <signal.h>
+#include <string.h>
 #include <time.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 
@@ -43,16 +46,21 @@ long MillisecondsNow() {
 // Takes what is left of a body that nobody asked for: some servers lose the
 // reply of a program that ends before it has read its input. Never waits for a
 // client that sends nothing, and for one that dawdles no longer than a moment.
+// An upload that was refused has a client that is still sending for certain: it
+// gets longer, however much it sends.
 void DiscardInput() {
-    constexpr long kMostBytes = 64L << 20;
-    constexpr long kMostMilliseconds = 1000;
+    const char* const type = getenv("CONTENT_TYPE");
+    const bool isUpload = type != nullptr && strstr(type, "multipart/form-data") != nullptr;
+    const long mostBytes = isUpload ? LONG_MAX : 64L << 20;
+    const long mostMilliseconds = isUpload ? 10000 : 1000;
+    constexpr long kPause = 1000;  // of an upload's client
     static char discarded[64 * 1024];
     struct pollfd input = {STDIN_FILENO, POLLIN, 0};
-    const long end = MillisecondsNow() + kMostMilliseconds;
+    const long end = MillisecondsNow() + mostMilliseconds;
     long total = 0;
-    for (long left = 0;
-         total < kMostBytes && left >= 0 && poll(&input, 1, static_cast<int>(left)) > 0;
-         left = end - MillisecondsNow()) {
+    for (long left = isUpload ? kPause : 0;
+         total < mostBytes && left >= 0 && poll(&input, 1, static_cast<int>(left)) > 0;
+         left = std::min(kPause, end - MillisecondsNow())) {
         const ssize_t count = read(STDIN_FILENO, discarded, sizeof discarded);
         if (count <= 0) {
             return;

@@ -37,6 +37,7 @@ constexpr CommandRow kCommands[] = {
     {"groups", true, 0, kAnyNumber, "none"},
     {"grant", true, 1, 1, "network"},
     {"revoke", true, 1, 1, ""},
+    {"rotate-key", false, 0, 0, ""},
 };
 
 bool Fail(std::string* problem, const std::string& text) {

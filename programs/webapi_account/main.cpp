@@ -6,6 +6,7 @@
 #include "Listing.h"
 #include "PasswordInput.h"
 #include "hosts/linux/sdk/Accounts.h"
+#include "hosts/linux/sdk/Cipher.h"
 
 namespace {
 
@@ -30,6 +31,8 @@ const char kUsage[] =
     "  revoke NAME PRIVILEGE       take that away, from everywhere\n"
     "  list                        print all accounts\n"
     "      --json                  as a JSON array\n"
+    "  rotate-key                  make another key for clients that encipher parameters;\n"
+    "                              the one before counts for another day\n"
     "  --help                      print this\n"
     "\n"
     "add and passwd ask for the password on the terminal, or read it as one line from a\n"
@@ -117,6 +120,9 @@ bool Run(const Arguments& arguments, std::string* problem) {
     }
     if (command == "revoke") {
         return talo::RevokePrivilege(name, arguments.words[0], problem);
+    }
+    if (command == "rotate-key") {
+        return talo::RotateCipherKey(problem);
     }
     return List(arguments, problem);
 }

@@ -4,10 +4,11 @@
 # shellcheck disable=SC2154  # project is set by common.sh
 
 # shellcheck disable=SC2034  # used by the scripts that read this file
-packages_build=(g++ cmake ninja-build libjsoncpp-dev libcrypt-dev)
+packages_build=(g++ cmake ninja-build libjsoncpp-dev libcrypt-dev
+    libsqlite3-dev libssl-dev libarchive-dev libidn2-dev media-types)
 # shellcheck disable=SC2034
-packages_test=(ccache libgtest-dev libgmock-dev python3 git curl pkg-config util-linux
-    lighttpd nginx fcgiwrap apache2-bin)
+packages_test=(ccache libgtest-dev libgmock-dev python3 nodejs git curl pkg-config util-linux
+    lighttpd nginx fcgiwrap apache2-bin libapache2-mod-xsendfile)
 # shellcheck disable=SC2034
 packages_check=(clang clang-format clang-tidy libclang-rt-14-dev shellcheck)
 
@@ -16,7 +17,7 @@ packages_of_server() {
     case $1 in
         lighttpd) echo lighttpd ;;
         nginx) echo nginx fcgiwrap ;;
-        apache) echo apache2-bin ;;
+        apache) echo apache2-bin libapache2-mod-xsendfile ;;
     esac
 }
 

@@ -1,7 +1,7 @@
 # shellcheck shell=bash
 # shellcheck disable=SC2154  # works on the variables of its caller
 # The parts of scripts/web-server. They work on its variables: root, run_dir,
-# webapi_dir, service_program, server, port, bind, server_pid, wrapper_pid.
+# webapi_dir, data_dir, service_program, server, port, bind, server_pid, wrapper_pid.
 # Needs common.sh.
 
 # A UNIX socket's path is short; the web server appends a process id to it.
@@ -31,7 +31,7 @@ check_address() {
 # The paths end up between double quotes in configurations.
 prepare_run_dir() {
     local path
-    for path in "$root" "$run_dir"; do
+    for path in "$root" "$run_dir" "$data_dir"; do
         [[ $path =~ [[:cntrl:]\"\'\$\\%] ]] && die "a web server cannot work in '$path'"
     done
     if [[ -e $run_dir && ! -e $run_dir/.web-server ]] && [[ -n $(ls -A "$run_dir") ]]; then
@@ -55,6 +55,8 @@ write_configuration() {
     local text user_line=''
     [[ $EUID -eq 0 ]] && user_line="user root;"
     text=$(<"$project/packaging/web-servers/$server.conf.in")
+    [[ -z $data_dir ]] || text=${text//'#send-files# '/}
+    text=${text//@DATA_DIR@/"$data_dir"}
     text=${text//@RUN_DIR@/"$run_dir"}
     text=${text//@SOCKET_DIR@/"$socket_dir"}
     text=${text//@WEBAPI_DIR@/"$webapi_dir"}
@@ -87,9 +89,10 @@ launch() {
     echo "$server_pid" >"$run_dir/server.pid"
 }
 
+# As many processes as requests are served at once; a slow client holds one.
 start_wrapper() {
     (cd "$run_dir" && exec setsid setpriv --pdeathsig TERM \
-        fcgiwrap -c 8 -s "unix:$socket_dir/fcgi.sock") >>"$run_dir/wrapper.log" 2>&1 </dev/null &
+        fcgiwrap -c 32 -s "unix:$socket_dir/fcgi.sock") >>"$run_dir/wrapper.log" 2>&1 </dev/null &
     wrapper_pid=$!
     local try
     for try in {1..100}; do
@@ -148,6 +151,14 @@ Try, in another terminal:
   curl -c jar -d 'api=TALO.Session&version=1&method=open&account=admin' \\
       --data-urlencode 'passwd="PASSWORD"' $entry
   curl -b jar -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
+END
+    grep -qsF '"name": "public"' "$root/etc/talo/shares" || return 0
+    cat <<END
+  curl -b jar -F file=@README.md '$entry?api=TALO.File&version=1&method=upload&path=/public'
+  curl -b jar -d 'api=TALO.File&version=1&method=list&folder=/public' $entry
+  curl -b jar -o copy.md '$entry?api=TALO.File&version=1&method=download&path=/public/README.md'
+  curl -b jar -d 'api=TALO.File.Checksum&version=1&method=start&path=/public' $entry
+  curl -b jar -d 'api=TALO.Task&version=1&method=status&task_id=TASK_ID' $entry
 END
 }
 

@@ -38,8 +38,8 @@ bool WebEntry::InitParam(Json::Value& document) {
         return true;
     }
     if (request->IsUploadRequest()) {
-        // The body of an upload is read later; the query has to say whose it is.
-        if (NamesAPI(Member(document, "getParam"))) {
+        // The body is read later, but for the API's identity where the query lacks it.
+        if (NamesAPI(Member(document, "getParam")) || LoadUploadAPIDesc(document["postParam"])) {
             return true;
         }
     } else if (InitPostParam(document["postParam"])) {

@@ -125,15 +125,6 @@ void WebEntry::AdoptSessionParameter() {
     request->InitEnv(document);
 }
 
-// Only methods that read the body themselves can be called with an upload.
-bool WebEntry::HandleUpload(APIRequest* request, APIResponse* response) {
-    if (GetMethodAttr(request, "deferUpload")) {
-        return true;
-    }
-    response->SetError(kErrorUpload, Json::Value());
-    return false;
-}
-
 bool WebEntry::ProcessRelay(APIRequest*, APIResponse* response) {
     response->SetError(kErrorRelay, Json::Value());
     return false;

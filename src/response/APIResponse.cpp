@@ -55,6 +55,11 @@ Json::Value APIResponse::GetHeaders() const {
     return d->GetData("headers", "", Json::Value(Json::objectValue));
 }
 
+// An empty key would empty the whole section.
+bool APIResponse::RemoveHeader(const std::string& name) {
+    return !name.empty() && d->ClearData("headers", name);
+}
+
 void APIResponse::SetServerError(const std::string& text) {
     d->SetData("headers", kServerErrorHeader, text, true);
 }

@@ -2,6 +2,10 @@
 
 #include <algorithm>
 
+#include "platform/Task.h"
+#include "src/base/JsonConvert.h"
+#include "webapi/APIRequest.h"
+
 namespace TALO {
 
 APIResponsePrivate::APIResponsePrivate(APIRequest* request, APIResponse* owner)
@@ -12,9 +16,31 @@ APIResponsePrivate::APIResponsePrivate(APIRequest* request, APIResponse* owner)
     store["option"] = Json::Value(Json::objectValue);
 }
 
-APIResponsePrivate::~APIResponsePrivate() = default;
+APIResponsePrivate::~APIResponsePrivate() {
+    delete task;
+}
+
+// A background task reports its result as any method does; the record is where
+// later requests find it.
+void APIResponsePrivate::OpenTask() {
+    if (task == nullptr && request != nullptr && request->IsPollingTask()) {
+        const std::string user = ToText(request->GetEnv("task_user", Json::Value()));
+        const std::string id = ToText(request->GetEnv("task_id", Json::Value()));
+        task = new ORB::Task(user.c_str(), id.c_str());
+    }
+}
+
+void APIResponsePrivate::RecordResult() {
+    if (task != nullptr) {
+        task->beginUpdate();
+        (void)task->setProperty("body", store["body"]);
+        (void)task->setProperty("task_run", true);
+        (void)task->endUpdate();
+    }
+}
 
 void APIResponsePrivate::SetError(int code, const Json::Value& details) {
+    OpenTask();
     // Built aside first: the details may be a part of the body that goes.
     Json::Value body(Json::objectValue);
     body["success"] = code == 0;
@@ -28,6 +54,7 @@ void APIResponsePrivate::SetError(int code, const Json::Value& details) {
     }
     store["body"].swap(body);
     error = code;
+    RecordResult();
 }
 
 void APIResponsePrivate::SetCallbackFunc(APIResponse::CallbackFunc function, void* argument) {

@@ -30,6 +30,10 @@ class APIResponsePrivate : public APIBase {
     ORB::Task* task = nullptr;
     int error = 0;
     APIResponse::CallbackList callbacks;
+
+  private:
+    void OpenTask();
+    void RecordResult();
 };
 
 }  // namespace TALO

@@ -10,6 +10,7 @@ from webserver import HOST
 
 class Case(unittest.TestCase):
     server = None  # the WebServer of this run
+    small_volume = None  # folder on a file system of its own, of some mebibytes
 
     def setUp(self):
         self.client = Client(HOST, self.server.port)

@@ -36,12 +36,14 @@ def _refuse(constant):
 
 
 class Client:
+    timeout = TIMEOUT
+
     def __init__(self, host, port):
         self.host = host
         self.port = port
 
     def request(self, method, path, body=None, headers=None):
-        connection = http.client.HTTPConnection(self.host, self.port, timeout=TIMEOUT)
+        connection = http.client.HTTPConnection(self.host, self.port, timeout=self.timeout)
         try:
             connection.request(method, path, body, {"Connection": "close", **(headers or {})})
             return _read(connection.getresponse())

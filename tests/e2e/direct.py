@@ -5,6 +5,7 @@ import os
 import pathlib
 import subprocess
 import sys
+import time
 import unittest
 
 ENTRY = None  # the program's path, from the command line
@@ -59,6 +60,18 @@ class Entry(unittest.TestCase):
                                    env={"REQUEST_METHOD": "POST", "CONTENT_LENGTH": "99999999"})
         reply, _ = process.communicate(b"x" * (20 << 20), timeout=60)
         self.assertIn(b'"code":101', reply)
+
+    def test_takes_in_an_upload_that_it_refuses_although_the_client_pauses(self):
+        process = subprocess.Popen(
+            [ENTRY], stdin=subprocess.PIPE, stdout=subprocess.PIPE, bufsize=0,
+            env={"REQUEST_METHOD": "POST", "CONTENT_TYPE": "multipart/form-data; boundary=b",
+                 "QUERY_STRING": "api=No.Such&version=1&method=upload",
+                 "CONTENT_LENGTH": str(100 << 20)})
+        for _ in range(100):
+            time.sleep(0.002)
+            self.assertEqual(process.stdin.write(b"x" * (1 << 20)), 1 << 20)
+        reply, _ = process.communicate(timeout=60)
+        self.assertIn(b'"code":102', reply)
 
     def test_serves_with_closed_standard_descriptors(self):
         command = f"exec '{ENTRY}' <&- 2>&-"

@@ -15,6 +15,8 @@ sys.path.insert(0, str(HERE))
 from case import Case  # noqa: E402
 from webserver import WebServer, processes_that_mention, wait_until  # noqa: E402
 
+MOUNTED = "WEBAPI_E2E_MOUNTED"
+SMALL_VOLUME_MEBIBYTES = 48
 SANITIZER = re.compile(r"ERROR: \w*Sanitizer|runtime error:")
 
 
@@ -33,11 +35,29 @@ def install_test_apis(root, modules):
     return installed
 
 
-def run_cases(pattern):
+def in_own_mounts(small_volume):
+    """Begins anew with a small file system on that folder, which ends with us.
+    Capabilities that this takes are given back before anything is tested."""
+    if MOUNTED in os.environ:
+        return
+    os.makedirs(small_volume, exist_ok=True)
+    unshare = ["unshare", "--mount"]
+    drop = ""
+    if os.geteuid() != 0:
+        unshare += ["--user", "--map-current-user", "--keep-caps"]
+        drop = "setpriv --inh-caps=-all --ambient-caps=-all"
+    script = (f'mount -t tmpfs -o size={SMALL_VOLUME_MEBIBYTES}m,mode=777 none "$1" && shift && '
+              f'exec {drop} "$@"')
+    os.execvpe("unshare", [*unshare, "sh", "-c", script, "sh", small_volume, sys.executable, "-B",
+                           os.path.abspath(__file__), *sys.argv[1:]],
+               {**os.environ, MOUNTED: "yes"})
+
+
+def run_cases(files, pattern):
     loader = unittest.TestLoader()
     if pattern:
         loader.testNamePatterns = [f"*{pattern}*"]
-    suite = loader.discover(str(HERE), pattern="test_*.py")
+    suite = loader.discover(str(HERE), pattern=files)
     result = unittest.TextTestRunner(verbosity=2).run(suite)
     return result.testsRun > 0 and result.wasSuccessful() and not result.skipped
 
@@ -60,15 +80,20 @@ def main():
     parser.add_argument("--root", required=True, help="the installed root")
     parser.add_argument("--run-dir", required=True, help="the web server's own folder")
     parser.add_argument("--modules", required=True, help="folder of the test API libraries")
+    parser.add_argument("--slow", action="store_true", help="the cases that take minutes")
     parser.add_argument("pattern", nargs="?", help="only cases with this in their name")
     arguments = parser.parse_args()
     run_dir = os.path.abspath(arguments.run_dir)
+    small_volume = f"{run_dir}-small-volume"
+    in_own_mounts(small_volume)
+    Case.small_volume = pathlib.Path(small_volume)
 
     installed = install_test_apis(arguments.root, arguments.modules)
     try:
         server = Case.server = WebServer(arguments.server, arguments.root, run_dir)
         try:
-            passed = run_cases(arguments.pattern)
+            files = "slow_*.py" if arguments.slow else "test_*.py"
+            passed = run_cases(files, arguments.pattern)
         finally:
             status = server.script.stop(signal.SIGTERM)
         complaints = list(complaints_after(server, status))

@@ -15,7 +15,8 @@ import unittest
 HERE = pathlib.Path(__file__).resolve().parent
 sys.path.insert(0, str(HERE))
 
-from client import Client  # noqa: E402
+from client import Client, form  # noqa: E402
+from multipart import Content, Form, digest, upload  # noqa: E402
 from webserver import (  # noqa: E402
     HOST, PROJECT, Foreground, free_port, processes_that_mention, wait_until)
 
@@ -60,7 +61,7 @@ class Serve(unittest.TestCase):
         self.assertIn(f"ready http://{HOST}:{port}/\n", script.output)
         self.assertIn(b'"success":true', Client(HOST, port).get(PING).body)
         self.logs_in(script, Client(HOST, port))
-        self.assertTrue(wait_until(lambda: "".join(script.output).count("curl ") == 3))
+        self.assertTrue(wait_until(lambda: "".join(script.output).count("curl ") == 8))
         self.assertEqual(script.stop(number), 0, "".join(script.output))
         self.assertTrue(wait_until(lambda: not processes_that_mention(str(self.checkout))),
                         processes_that_mention(str(self.checkout)))
@@ -80,6 +81,20 @@ class Serve(unittest.TestCase):
         name, password = self.administrator
         reply = client.call("TALO.Session", "open", account=name, passwd=json.dumps(password))
         self.assertTrue(reply.document()["success"], reply)
+        self.shares(client, reply.document()["data"]["sid"])
+
+    def shares(self, client, sid):
+        """The share of a new root takes a file and gives it back."""
+        content = Content(3 << 20)
+        call = {"api": "TALO.File", "version": 1, "_sid": sid}
+        reply = upload(client, form(method="upload", path="/public", overwrite="true", **call),
+                       Form().file("file", "a file", content))
+        self.assertTrue(reply.document()["success"], reply)
+        reply = client.get(form(method="list", folder="/public", **call))
+        self.assertEqual([entry["name"] for entry in reply.document()["data"]["entries"]],
+                         ["a file"])
+        reply = client.get(form(method="download", path="/public/a file", **call))
+        self.assertEqual(digest([reply.body]), content.sha256())
 
     def test_serves_with_each_web_server_until_it_is_told_to_stop(self):
         self.serves_and_stops(signal.SIGTERM)

@@ -86,8 +86,9 @@ class Foreground:
 class WebServer:
     """Serves a root on a free loopback port."""
 
-    def __init__(self, name, root, run_dir):
+    def __init__(self, name, root, run_dir, options=()):
         self.name = name
+        self.options = [str(option) for option in options]
         self.root = pathlib.Path(root).resolve()
         self.run_dir = pathlib.Path(run_dir)
         self.webapi_dir = self.root / "usr/talo/taloman/webapi"
@@ -102,7 +103,7 @@ class WebServer:
 
     def command(self):
         return [str(PROJECT / "scripts/web-server"), "--server", self.name, "--port",
-                str(self.port), "--root", str(self.root), "--run-dir", str(self.run_dir)]
+                str(self.port), "--root", str(self.root), "--run-dir", str(self.run_dir), *self.options]
 
     def restarts(self):
         """How often the server has finished a start or a restart, by its own log."""

@@ -6,10 +6,12 @@
 #include <iostream>
 #include <stdexcept>
 
+#include "webapi/APIDownload.h"
 #include "webapi/APIExport.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
 #include "webapi/APITable.h"
+#include "webapi/APIUpload.h"
 
 // The API library behind the tests of the entry. Callbacks leave one line each
 // in the file that the environment variable ENTRY_TRACE names.
@@ -95,6 +97,55 @@ void RestartOnly(APIRequest*, APIResponse* response) {
     response->SetSuccess(Json::Value());
 }
 
+// Which parameters are paths that this request's upload made.
+Json::Value Trusted(APIRequest* request, const Json::Value& params) {
+    const TALO::APIUpload upload(request);
+    Json::Value trusted(Json::objectValue);
+    for (const std::string& name : params.getMemberNames()) {
+        trusted[name] = upload.IsUploadedFile(params[name].asString());
+    }
+    return trusted;
+}
+
+void Trust(APIRequest* request, APIResponse* response) {
+    response->SetSuccess(Trusted(request, request->GetParam("", Json::Value())));
+}
+
+unsigned long long lastDone = 0;
+unsigned long long lastTotal = 0;
+
+void Count(unsigned long long done, unsigned long long total) {
+    lastDone = done;
+    lastTotal = total;
+}
+
+// Reads an upload by itself, as a method does that "deferUpload" leaves it to.
+void Reading(APIRequest* request, APIResponse* response) {
+    TALO::APIUpload upload(request);
+    upload.SetUploadCallback(Count);
+    Json::Value data(Json::objectValue);
+    Json::Value params(Json::objectValue);
+    data["before"] = request->GetParam("", Json::Value());
+    data["paramStatus"] = upload.GetUploadParam(params);
+    data["fields"] = params;
+    data["fileStatus"] = upload.GetUploadFile(params);
+    data["all"] = params;
+    data["trusted"] = Trusted(request, params);
+    data["done"] = static_cast<Json::UInt64>(lastDone);
+    data["total"] = static_cast<Json::UInt64>(lastTotal);
+    response->SetSuccess(data);
+}
+
+void Download(APIRequest*, APIResponse* response) {
+    Later(nullptr, response);
+    response->SetEnableOutput(false);
+    TALO::APIDownload download(response);
+    (void)download.SetHeader("Content-type", "text/plain");
+    (void)download.SetHeader("X-Content-Type-Options", "nosniff");
+    std::cout << "before;";
+    (void)download.Output("/some/file.txt");
+}
+
 TALO::_tag_API_TABLE table[] = {
     {"Test.Entry", 1, "echo", Echo},         {"Test.Entry", 2, "echo", Echo},
     {"Test.Entry", 1, "silent", Silent},     {"Test.Entry", 1, "throwing", Throwing},
@@ -102,7 +153,8 @@ TALO::_tag_API_TABLE table[] = {
     {"Test.Entry", 1, "later", Later},       {"Test.Entry", 1, "ownOutput", OwnOutput},
     {"Test.Entry", 1, "restart", Restart},   {"Test.Entry", 1, "restartOnly", RestartOnly},
     {"Test.Entry", 1, "upload", Echo},       {"Test.Entry", 1, "deferred", Echo},
-    {nullptr, 0, nullptr, nullptr},
+    {"Test.Entry", 1, "trust", Trust},       {"Test.Entry", 1, "reading", Reading},
+    {"Test.Entry", 1, "download", Download}, {nullptr, 0, nullptr, nullptr},
 };
 
 }  // namespace

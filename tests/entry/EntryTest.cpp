@@ -21,7 +21,10 @@ const char kDescription[] = R"({"Test.Entry": {
         "1": ["echo", "silent", "throwing", "printing", "notFound", "later", "ownOutput",
               "restart", "restartOnly",
               {"upload": {"allowUpload": true}},
-              {"deferred": {"allowUpload": true, "deferUpload": true}}],
+              {"trust": {"allowUpload": true}},
+              {"deferred": {"allowUpload": true, "deferUpload": true}},
+              {"reading": {"allowUpload": true, "deferUpload": true}},
+              {"download": {"allowDownload": true}}],
         "2": ["echo"],
         "3": ["unknown"]}}})";
 

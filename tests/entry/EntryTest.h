@@ -46,7 +46,7 @@ struct Reply {
 };
 
 // The entry with its request and response in sight.
-class ProbeEntry : public TALO::WebEntry {
+class ProbeEntry final : public TALO::WebEntry {
   public:
     using TALO::WebEntry::request;
     using TALO::WebEntry::response;

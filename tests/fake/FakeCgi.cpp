@@ -2,6 +2,7 @@
 #include <string.h>
 
 #include "platform/Cgi.h"
+#include "platform/System.h"
 #include "tests/fake/FakePlatform.h"
 
 struct TALOCGIState {
@@ -53,6 +54,7 @@ void TaloCgiFree(TALOCGI* ctx) {
         --fake::Now().openContexts;
     }
     delete ctx->state;
+    TLIBCSzHashFree(ctx->paramHash);
     memset(ctx, 0, sizeof *ctx);
 }
 

@@ -1,5 +1,7 @@
 #include "tests/fake/FakePlatform.h"
 
+#include "tests/fake/FakeTask.h"
+
 namespace fake {
 
 namespace {
@@ -12,6 +14,7 @@ Platform& Now() {
 
 void Reset() {
     platform = Platform();
+    ResetTasks();
 }
 
 void Platform::FailCall(const std::string& operation, int nth) {

@@ -3,6 +3,8 @@
 #include <string.h>
 #include <unistd.h>
 
+#include "hosts/linux/net/Address.h"
+#include "hosts/linux/net/NameRules.h"
 #include "platform/System.h"
 #include "tests/fake/FakePlatform.h"
 
@@ -16,6 +18,15 @@ int Folder(const std::map<std::string, std::string>& folders, const char* name, 
     }
     memcpy(buffer, found->second.c_str(), found->second.size() + 1);
     return 0;
+}
+
+// Without internationalised names: those need a module.
+int NameAnswer(const char* operation, const char* text, int byRule) {
+    fake::Platform& platform = fake::Now();
+    const std::pair<std::string, std::string> call(operation, text);
+    platform.nameCalls.push_back(call);
+    const auto answer = platform.nameAnswers.find(call);
+    return answer != platform.nameAnswers.end() ? answer->second : byRule;
 }
 
 }  // namespace
@@ -99,6 +110,18 @@ int TALOGroupPreferenceDirGet(const char* group, char* buffer, size_t size) {
 int TLIBNetService(int service, int action, int flags) {
     fake::Now().services.push_back({service, action, flags});
     return fake::Now().Called("TLIBNetService") ? -1 : 0;
+}
+
+int TALONetGetAddrType(const char* text) {
+    return NameAnswer("TALONetGetAddrType", text, host::AddressFamily(text));
+}
+
+int BlTLIBIsDomain(const char* text) {
+    return NameAnswer("BlTLIBIsDomain", text, host::IsDomainName(text) ? 1 : 0);
+}
+
+int BlTLIBIsHostname(const char* text) {
+    return NameAnswer("BlTLIBIsHostname", text, host::IsHostName(text) ? 1 : 0);
 }
 
 }  // extern "C"

@@ -29,6 +29,21 @@ TEST_F(ResponseHeaders, AnswersTheFallbackForWhatIsNotThere) {
     EXPECT_EQ(response.GetHeader("content-type", "none"), "none") << "names are case-sensitive";
 }
 
+TEST_F(ResponseHeaders, TakesOneOut) {
+    response.SetHeader("X-One", "1");
+    EXPECT_TRUE(response.RemoveHeader("Content-type"));
+    EXPECT_FALSE(response.HasHeader("Content-type"));
+    EXPECT_TRUE(response.HasHeader("X-One"));
+}
+
+TEST_F(ResponseHeaders, TakesNothingOutThatIsNotThere) {
+    const Json::Value before = response.GetHeaders();
+    for (const char* name : {"", "content-type", "X-One"}) {
+        EXPECT_FALSE(response.RemoveHeader(name)) << name;
+    }
+    EXPECT_EQ(response.GetHeaders(), before);
+}
+
 TEST_F(ResponseHeaders, KeepsAnEmptyValue) {
     EXPECT_TRUE(response.SetHeader("X-One", ""));
     EXPECT_TRUE(response.HasHeader("X-One"));

@@ -14,6 +14,7 @@
 #include "hosts/linux/util/Descriptor.h"
 #include "hosts/linux/util/HostLog.h"
 #include "hosts/linux/util/SmallFile.h"
+#include "hosts/linux/util/TrustedFile.h"
 #include "platform/System.h"
 
 namespace host {
@@ -25,36 +26,6 @@ constexpr unsigned kLastUid = std::numeric_limits<int>::max();
 
 bool Refuse(std::string* problem, const std::string& text) {
     *problem = text;
-    return false;
-}
-
-// Whoever can write the file can make himself an administrator.
-bool IsTrusted(int file, std::string* reason) {
-    struct stat facts = {};
-    if (fstat(file, &facts) != 0) {
-        return Refuse(reason, strerror(errno));
-    }
-    if (facts.st_uid != 0 && facts.st_uid != geteuid()) {
-        return Refuse(reason, "it belongs to another user");
-    }
-    if ((facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
-        return Refuse(reason, "others than its owner may write it");
-    }
-    return true;
-}
-
-bool ReadAccounts(const std::string& path, std::string* content) {
-    const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOFOLLOW));
-    if (file.Get() < 0 && errno == ENOENT) {
-        content->clear();
-        return true;
-    }
-    std::string reason = file.Get() < 0 ? strerror(errno) : "";
-    if (file.Get() >= 0 && IsTrusted(file.Get(), &reason) &&
-        ReadSmallFile(file.Get(), kMaxAccountsBytes, content, &reason)) {
-        return true;
-    }
-    HOST_LOG("cannot use %s: %s", path.c_str(), reason.c_str());
     return false;
 }
 
@@ -160,7 +131,7 @@ bool Edit(const std::string& path, const ContentChange& change, std::string* pro
         return Refuse(problem, "cannot lock " + path + ": " + strerror(errno));
     }
     std::string content;
-    if (!ReadAccounts(path, &content)) {
+    if (!ReadTrustedFile(path, kMaxAccountsBytes, &content)) {
         return Refuse(problem, "cannot use " + path + "; the system log says why");
     }
     if (!change(&content, problem)) {
@@ -179,7 +150,7 @@ bool Edit(const std::string& path, const ContentChange& change, std::string* pro
 
 Lookup FindInFile(const std::string& path, const std::string& name, StoredAccount* stored) {
     std::string content;
-    if (!ReadAccounts(path, &content)) {
+    if (!ReadTrustedFile(path, kMaxAccountsBytes, &content)) {
         return Lookup::kUnavailable;
     }
     Lookup result = Lookup::kAbsent;
@@ -198,7 +169,7 @@ Lookup FindInFile(const std::string& path, const std::string& name, StoredAccoun
 
 bool ListFile(const std::string& path, std::vector<talo::Account>* accounts) {
     std::string content;
-    if (!ReadAccounts(path, &content)) {
+    if (!ReadTrustedFile(path, kMaxAccountsBytes, &content)) {
         return false;
     }
     std::map<std::string, talo::Account> byName;

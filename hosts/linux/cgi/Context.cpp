@@ -84,12 +84,8 @@ void TaloCgiFree(TALOCGI* ctx) {
         return;
     }
     delete ctx->state;
+    TLIBCSzHashFree(ctx->paramHash);
     std::memset(ctx, 0, sizeof *ctx);
-}
-
-// No enciphered form of a whole line is known here: every line is a plain one.
-int TaloCgiDetectAndDecryptParamLine(char* line) {
-    return line != nullptr ? 1 : 0;
 }
 
 }  // extern "C"

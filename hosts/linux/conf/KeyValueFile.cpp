@@ -1,7 +1,8 @@
 #include "hosts/linux/conf/KeyValueFile.h"
 
-#include <algorithm>
+#include <charconv>
 
+#include "hosts/linux/conf/KeyValueText.h"
 #include "hosts/linux/util/SmallFile.h"
 #include "platform/Paths.h"
 
@@ -11,43 +12,52 @@ namespace {
 
 constexpr size_t kMaxBytes = 1u << 20;
 
-std::string Trimmed(const std::string& text) {
-    const size_t first = text.find_first_not_of(" \t\r");
-    return first == std::string::npos
-               ? std::string()
-               : text.substr(first, text.find_last_not_of(" \t\r") - first + 1);
-}
-
-std::string Unquoted(const std::string& text) {
-    const bool quoted = text.size() >= 2 && text.front() == '"' && text.back() == '"';
-    return quoted ? text.substr(1, text.size() - 2) : text;
+bool ReadContent(const char* path, std::string* content) {
+    std::string reason;
+    return ReadSmallFile(path, kMaxBytes, content, &reason);
 }
 
 }  // namespace
 
 std::string ReadKey(const char* path, const std::string& key) {
     std::string content;
-    std::string reason;
-    if (!ReadSmallFile(path, kMaxBytes, &content, &reason)) {
-        return std::string();
-    }
     std::string value;
-    for (size_t start = 0; start < content.size();) {
-        const size_t end = std::min(content.find('\n', start), content.size());
-        const std::string line = Trimmed(content.substr(start, end - start));
-        const size_t equals = line.find('=');
-        if (!line.empty() && line[0] != '#' && equals != std::string::npos &&
-            Trimmed(line.substr(0, equals)) == key) {
-            value = Unquoted(Trimmed(line.substr(equals + 1)));
-        }
-        start = end + 1;
+    if (ReadContent(path, &content)) {
+        (void)FindKey(content, key, &value);
     }
     return value;
 }
 
-std::string HostSetting(const std::string& key, const std::string& fallback) {
-    const std::string value = ReadKey(TALO_HOST_CONF, key);
+bool FileHasKeyValue(const char* path, const std::string& key, const std::string& value) {
+    std::string content;
+    return ReadContent(path, &content) && HasKeyValue(content, key, value);
+}
+
+HostSettings::HostSettings() {
+    (void)ReadContent(TALO_HOST_CONF, &content_);
+}
+
+std::string HostSettings::Text(const std::string& key, const std::string& fallback) const {
+    std::string value;
+    (void)FindKey(content_, key, &value);
     return value.empty() ? fallback : value;
+}
+
+bool HostSettings::ReadLimit(const std::string& key, unsigned long long most,
+                             unsigned long long* value) const {
+    const std::string text = Text(key, "");
+    const char* end = text.data() + text.size();
+    unsigned long long number = 0;
+    const auto result = std::from_chars(text.data(), end, number);
+    if (result.ec != std::errc() || result.ptr != end || number == 0 || number > most) {
+        return false;
+    }
+    *value = number;
+    return true;
+}
+
+std::string HostSetting(const std::string& key, const std::string& fallback) {
+    return HostSettings().Text(key, fallback);
 }
 
 }  // namespace host

@@ -32,6 +32,17 @@ int TLIBCConfGetORBTimeout(void) {
     }
 }
 
+int TLIBCFileCheckKeyValue(const char* file, const char* key, const char* value, int) {
+    if (file == nullptr || key == nullptr || *key == '\0' || value == nullptr) {
+        return 0;
+    }
+    try {
+        return host::FileHasKeyValue(file, key, value) ? 1 : 0;
+    } catch (const std::exception&) {
+        return 0;
+    }
+}
+
 void TLIBCStrCaseLower(char* text, size_t size) {
     if (text == nullptr) {
         return;

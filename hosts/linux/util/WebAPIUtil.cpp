@@ -6,6 +6,7 @@
 #include "hosts/linux/util/JsonFile.h"
 #include "hosts/linux/util/ParameterLine.h"
 #include "hosts/linux/util/Percent.h"
+#include "hosts/linux/util/SzHash.h"
 
 namespace TALO {
 
@@ -44,6 +45,15 @@ bool WebAPIUtil::strPairToJsonObj(const std::string& line, Json::Value& out, boo
         return host::MergeParameterLine(line, out, decode, parseJson);
     } catch (const std::exception& exception) {
         HOST_LOG("cannot read a parameter line: %s", exception.what());
+        return false;
+    }
+}
+
+bool WebAPIUtil::SzHashToJsonObj(const TALOSZHASH* hash, Json::Value& out) {
+    try {
+        return host::HashToJson(hash, out);
+    } catch (const std::exception& exception) {
+        HOST_LOG("cannot copy a hash: %s", exception.what());
         return false;
     }
 }
