@@ -99,14 +99,16 @@ bool MakeTables(Connection* connection) {
 bool PrepareSchema(Connection* connection) {
     // The log is written back early: who comes first has to read all of it.
     static const char* const kSettings[] = {
-        "PRAGMA wal_autocheckpoint = 100",
+        "PRAGMA wal_autocheckpoint = 32",
         "PRAGMA journal_size_limit = 4194304",
         "PRAGMA cell_size_check = ON",
     };
     long long version = 0;
     if (!RunAll(connection, std::begin(kSettings), std::end(kSettings)) ||
-        !ReadVersion(connection, &version) || (version == 0 && !MakeTables(connection)) ||
         !ReadVersion(connection, &version)) {
+        return false;
+    }
+    if (version == 0 && !(MakeTables(connection) && ReadVersion(connection, &version))) {
         return false;
     }
     if (version != kVersion) {

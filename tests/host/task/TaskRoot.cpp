@@ -102,12 +102,22 @@ int WaitFor(pid_t process) {
     return WIFSIGNALED(status) ? 1000 + WTERMSIG(status) : WEXITSTATUS(status);
 }
 
+// A new file, since the old one may be in use.
+static void PutModule(const char* built) {
+    const fs::path module = fs::path(TALO_MODULE_DIR) / "talo-task.so";
+    fs::create_directories(module.parent_path());
+    fs::remove(module);
+    fs::copy_file(built, module);
+}
+
 void TaskRoot::SetUp() {
+    PutModule(TASK_MODULE);
     ClearTasks();
 }
 
 void TaskRoot::TearDown() {
     ClearTasks();
+    PutModule(INSTALLED_TASK_MODULE);
 }
 
 void TaskRoot::Configure(const std::string& lines) {

@@ -205,7 +205,8 @@ TEST_F(Trouble, WithoutSpaceLosesNothing) {
         ASSERT_TRUE(Begin(&task) && task.setProperty("x", 0));
         int stored = 0;
         const auto grow = [&] {
-            return task.setProperty("x", std::string(static_cast<size_t>(1000 + stored), 'x'));
+            return task.setProperty("x",
+                                    std::string(static_cast<size_t>(1000 + 100 * stored), 'x'));
         };
         while (stored < 2000 && grow()) {
             ++stored;
@@ -221,7 +222,8 @@ TEST_F(Trouble, WithoutSpaceLosesNothing) {
         EXPECT_EQ(InProcess([&] {
                       EXPECT_FALSE(ORB::Task("anna", "one").hasProperty("b"));
                       const Json::Value x = Stored("one", "x");
-                      EXPECT_EQ(x.asString().size(), static_cast<size_t>(1000 + stored - 1));
+                      EXPECT_EQ(x.asString().size(),
+                                static_cast<size_t>(1000 + 100 * (stored - 1)));
                       EXPECT_EQ(Stored("one", "auto_remove"), Json::Value(true));
                       return 0;
                   }),
