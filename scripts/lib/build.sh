@@ -1,5 +1,5 @@
 # shellcheck shell=bash
-# Configuring and building by preset. Needs common.sh.
+# Configuring, building and testing by preset. Needs common.sh.
 # shellcheck disable=SC2154  # project is set by common.sh
 
 # The folder of a preset's build: build_folder PRESET
@@ -19,4 +19,13 @@ configure_and_build() {
     quietly "$project/build/$preset.build.log" \
         cmake --build "$(build_folder "$preset")" --parallel "$(nproc)" "$@" ||
         die "preset $preset cannot be built"
+}
+
+# run_tests PRESET [ARGUMENT OF ctest]...: one more at a time than there are
+# processors, because many of them wait.
+run_tests() {
+    local preset=$1
+    shift
+    ctest --test-dir "$(build_folder "$preset")" -j"$(($(nproc) + 1))" --output-on-failure \
+        --no-tests=error "$@"
 }

@@ -48,19 +48,30 @@ check_warnings() {
     configure_and_build dev
 }
 
+# The tests compile sources of the product again, for another root; clang-tidy would
+# look at them as often.
+one_command_per_file() {
+    python3 -c '
+import json, sys
+commands = {command["file"]: command for command in reversed(json.load(sys.stdin))}
+json.dump(list(commands.values()), sys.stdout, indent=0, ensure_ascii=False)'
+}
+
 check_tidy() {
     configure_and_build dev
+    mkdir -p build/tidy
+    one_command_per_file <build/dev/compile_commands.json >build/tidy/compile_commands.json
     # Only what the build knows how to compile.
     sources '*.cpp' | while IFS= read -r -d '' file; do
-        if grep -qF "\"file\": \"$project/$file\"" build/dev/compile_commands.json; then
+        if grep -qF "\"file\": \"$project/$file\"" build/tidy/compile_commands.json; then
             printf '%s\0' "$file"
         fi
-    done | xargs -0 -n1 -P"$(nproc)" clang-tidy --quiet -p build/dev
+    done | xargs -0 -n1 -P"$(nproc)" clang-tidy --quiet -p build/tidy
 }
 
 check_sanitizers() {
     configure_and_build asan
-    ctest --test-dir build/asan -j2 --output-on-failure --no-tests=error -LE '^slow$'
+    run_tests asan -LE '^slow$'
 }
 
 # fuzz_target PROGRAM: from the kept seeds, in a corpus of the build's own.
@@ -72,7 +83,8 @@ fuzz_target() {
     if [[ -d fuzz/corpus/$name ]]; then
         cp -r "fuzz/corpus/$name/." "$corpus/"
     fi
-    "$1" "$corpus" -max_total_time="${FUZZ_SECONDS:-20}" -timeout=10 -rss_limit_mb=2048 \
+    quietly "build/fuzz/$name.log" \
+        "$1" "$corpus" -max_total_time="${FUZZ_SECONDS:-20}" -timeout=10 -rss_limit_mb=2048 \
         -artifact_prefix=build/fuzz/findings/ -verbosity=0
 }
 
@@ -83,7 +95,8 @@ check_fuzz() {
         [[ -x $program ]] && programs+=("$program")
     done
     [[ ${#programs[@]} -gt 0 ]] || die "no fuzz targets"
-    for program in "${programs[@]}"; do
-        fuzz_target "$program"
-    done
+    # Each has a processor to itself.
+    export -f fuzz_target quietly
+    printf '%s\0' "${programs[@]}" |
+        xargs -0 -n1 -P"$(nproc)" bash -euo pipefail -c "fuzz_target \"\$1\"" fuzz
 }
