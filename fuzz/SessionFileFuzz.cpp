@@ -21,7 +21,7 @@ bool IsSame(const talo::Session& left, const talo::Session& right) {
            left.language == right.language && left.application == right.application &&
            left.privilege == right.privilege && left.timeout == right.timeout &&
            left.skipAddress == right.skipAddress && left.handle == right.handle &&
-           left.created == right.created;
+           left.created == right.created && left.node == right.node;
 }
 
 // The writer mends a text that is no UTF-8, so what was read once may change
@@ -44,9 +44,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     }
     Require(!session.user.empty() && !session.handle.empty());
     Require(session.timeout >= 0 && session.timeout <= 366 * 24 * 60);
+    Require(session.node >= 0);
     const talo::Session once = WrittenAndRead(session);
     Require(once.timeout == session.timeout && once.skipAddress == session.skipAddress &&
-            once.created == session.created);
+            once.created == session.created && once.node == session.node);
     Require(IsSame(WrittenAndRead(once), once));
     session.lastUse = 1700000000;
     Require(!host::HasTimedOut(session, 30, session.lastUse));

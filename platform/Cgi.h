@@ -75,8 +75,9 @@ TALO_PLATFORM void TaloCgiFree(TALOCGI* ctx);
 // `name` (`size` bytes) and fills the context's session members.
 // 1 a user, 2 an administrator, 0 no access; -1 timed out, -2 no such session,
 // -3 the client's address changed, -4 the request comes from another site's
-// page, -6 the account is gone or locked. -5 is never answered: the framework
-// uses it for "not asked". `flags` is reserved and 0. Does not renew the session.
+// page, -6 the account is gone or locked, or whoever holds the session for it may
+// no longer act for it. -5 is never answered: the framework uses it for "not
+// asked". `flags` is reserved and 0. Does not renew the session.
 TALO_PLATFORM int TaloCgiIsAuthorizedEx(TALOCGI* ctx, const char* sessionId, char* name,
                                         size_t size, const TALOCGIAUTHREQUEST* request, int flags);
 

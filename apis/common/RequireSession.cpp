@@ -13,8 +13,11 @@ using TALO::APIResponse;
 
 namespace {
 
-// The framework's own code and text for a call without a session.
+// The framework's own codes and texts for a session that does not do.
+constexpr int kTimedOut = 106;
 constexpr int kNoSessionId = 119;
+const char kTimedOutText[] = "timeout";
+const char kRefusedText[] = "noprivilege";
 const char kNoSessionText[] = "unauth";
 
 void GiveSessionFacts(APIRequest* request, const std::string& id) {
@@ -44,6 +47,7 @@ bool RequireSession(APIRequest* request, APIResponse* response, SessionUse use) 
     if (!TALO::APIAuth::CheckPermission(request, response, id.c_str(),
                                         use == SessionUse::kEvenTimedOut)) {
         request->InitSession(Json::Value());
+        response->SetServerError(response->GetError() == kTimedOut ? kTimedOutText : kRefusedText);
         return false;
     }
     if (use == SessionUse::kRenew) {

@@ -19,6 +19,9 @@ Json::Value Describe(const talo::Session& session) {
     facts["address"] = session.address;
     facts["created"] = static_cast<Json::Int64>(session.created);
     facts["last_use"] = static_cast<Json::Int64>(session.lastUse);
+    if (session.node != 0) {
+        facts["node"] = static_cast<Json::Int64>(session.node);
+    }
     return facts;
 }
 

@@ -81,7 +81,9 @@ class WEBAPI_EXPORT APIRunner {
 
     /// Runs one method in-process as `user`, without any permission check, and
     /// leaves its result document in `out`. Null `api`, `method` or `user`: 101.
-    /// Restores the working directory; throws nothing.
+    /// Restores the working directory; throws nothing. Enciphered parameters in
+    /// `params` are read, and what they hold wins, even over `api` and `method`: of
+    /// an object that a client wrote, pass on the members that are meant.
     static void Exec(Json::Value& out, const char* api, int version, const char* method,
                      const Json::Value& params, const Json::Value& attrs, const char* user);
     static void Exec(Json::Value& out, const char* api, int version, const char* method,

@@ -67,7 +67,19 @@ class WEBAPI_EXPORT WebEntry : public APIRunner {
     bool DecryptParam(const std::string& text, Json::Value& params);
     bool DecryptAESParam(Json::Value& params);
 
-    /// Forwards the request to the appliance that "relay_nd" names.
+    /// Forwards the request to the appliance that "relay_nd" names, an integer or
+    /// its decimal text, and writes that appliance's answer to standard output as it
+    /// came, behind the header block of this one. The call is checked against the
+    /// descriptions here (101 to 104, 115, 116) and needs a session (105, 106, 119),
+    /// which may have timed out where the API's description has "skipTimeout";
+    /// whether the user may call the method is for the target to say. Neither
+    /// "relay_nd" nor "relay_timeout", seconds to wait when above 0, is forwarded.
+    /// The body of an upload passes through unread; one that names its API in the
+    /// body, of which a part was read here, is 109.
+    ///
+    /// True when an answer was written: the response's output is off then. False
+    /// with an error on the response: one of the above, 101 for a "relay_nd" that is
+    /// no integer, 109 when the call could not be queued or failed.
     bool ProcessRelay(APIRequest* request, APIResponse* response);
 
     /// Write to standard output.

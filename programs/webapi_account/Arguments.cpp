@@ -2,9 +2,26 @@
 
 #include <getopt.h>
 
+#include <limits>
+
 namespace {
 
-enum Option { kAdmin = 1, kGenerate, kExpires, kNetwork, kNone, kJson, kHelp };
+enum Option {
+    kAdmin = 1,
+    kGenerate,
+    kExpires,
+    kNetwork,
+    kNone,
+    kJson,
+    kUrl,
+    kSelf,
+    kAuthority,
+    kPin,
+    kAccept,
+    kClass,
+    kUser,
+    kHelp
+};
 
 const struct option kOptions[] = {
     {"admin", no_argument, nullptr, kAdmin},
@@ -13,31 +30,44 @@ const struct option kOptions[] = {
     {"network", required_argument, nullptr, kNetwork},
     {"none", no_argument, nullptr, kNone},
     {"json", no_argument, nullptr, kJson},
+    {"url", required_argument, nullptr, kUrl},
+    {"self", required_argument, nullptr, kSelf},
+    {"authority", required_argument, nullptr, kAuthority},
+    {"pin", required_argument, nullptr, kPin},
+    {"accept", no_argument, nullptr, kAccept},
+    {"class", required_argument, nullptr, kClass},
+    {"user", required_argument, nullptr, kUser},
     {"help", no_argument, nullptr, kHelp},
     {nullptr, 0, nullptr, 0},
 };
 
 constexpr size_t kAnyNumber = 1000;
 
+enum class Subject { kNothing, kAccount, kNode };
+
 struct CommandRow {
     const char* command;
-    bool takesName;
-    size_t leastWords;  // behind the name
+    Subject subject;    // the first word
+    size_t leastWords;  // behind it
     size_t mostWords;
     const char* options;
 };
 
 constexpr CommandRow kCommands[] = {
-    {"add", true, 0, 0, "admin generate"},
-    {"passwd", true, 0, 0, "generate expires"},
-    {"remove", true, 0, 0, ""},
-    {"list", false, 0, 0, "json"},
-    {"lock", true, 0, 0, ""},
-    {"unlock", true, 0, 0, ""},
-    {"groups", true, 0, kAnyNumber, "none"},
-    {"grant", true, 1, 1, "network"},
-    {"revoke", true, 1, 1, ""},
-    {"rotate-key", false, 0, 0, ""},
+    {"add", Subject::kAccount, 0, 0, "admin generate"},
+    {"passwd", Subject::kAccount, 0, 0, "generate expires"},
+    {"remove", Subject::kAccount, 0, 0, ""},
+    {"list", Subject::kNothing, 0, 0, "json"},
+    {"lock", Subject::kAccount, 0, 0, ""},
+    {"unlock", Subject::kAccount, 0, 0, ""},
+    {"groups", Subject::kAccount, 0, kAnyNumber, "none"},
+    {"grant", Subject::kAccount, 1, 1, "network"},
+    {"revoke", Subject::kAccount, 1, 1, ""},
+    {"rotate-key", Subject::kNothing, 0, 0, ""},
+    {"node add", Subject::kNode, 0, 0, "url self authority pin accept class"},
+    {"node list", Subject::kNothing, 0, 0, "json"},
+    {"node remove", Subject::kNode, 0, 0, ""},
+    {"node test", Subject::kNode, 0, 0, "user"},
 };
 
 bool Fail(std::string* problem, const std::string& text) {
@@ -45,19 +75,40 @@ bool Fail(std::string* problem, const std::string& text) {
     return false;
 }
 
-bool ParseDays(const char* text, long long* days) {
-    constexpr long long kMost = 36500;
+bool ParseNumber(const char* text, long long most, long long* number) {
     long long value = 0;
     if (*text == '\0') {
         return false;
     }
     for (; *text != '\0'; ++text) {
-        if (*text < '0' || *text > '9' || (value = value * 10 + (*text - '0')) > kMost) {
+        const int digit = *text - '0';
+        if (digit < 0 || digit > 9 || value > (most - digit) / 10) {
             return false;
         }
+        value = value * 10 + digit;
     }
-    *days = value;
+    *number = value;
     return true;
+}
+
+bool ParseDays(const char* text, long long* days) {
+    constexpr long long kMost = 36500;
+    return ParseNumber(text, kMost, days);
+}
+
+bool ParseNode(const char* text, long long* node) {
+    long long number = 0;
+    if (!ParseNumber(text, std::numeric_limits<long long>::max(), &number) || number == 0) {
+        return false;
+    }
+    *node = number;
+    return true;
+}
+
+// What an option that takes a text has; it says nothing when it is empty.
+bool TakeText(const char* option, std::string* text, std::string* problem) {
+    *text = optarg;
+    return !text->empty() || Fail(problem, std::string(option) + " takes a text");
 }
 
 bool Take(int option, Arguments* arguments, std::string* problem) {
@@ -80,6 +131,23 @@ bool Take(int option, Arguments* arguments, std::string* problem) {
         case kJson:
             arguments->json = true;
             return true;
+        case kUrl:
+            return TakeText("--url", &arguments->url, problem);
+        case kSelf:
+            return ParseNode(optarg, &arguments->self) ||
+                   Fail(problem, "--self takes a number from 1 up");
+        case kAuthority:
+            return TakeText("--authority", &arguments->authority, problem);
+        case kPin:
+            return TakeText("--pin", &arguments->pin, problem);
+        case kAccept:
+            arguments->accept = true;
+            return true;
+        case kClass:
+            arguments->classes.emplace_back();
+            return TakeText("--class", &arguments->classes.back(), problem);
+        case kUser:
+            return TakeText("--user", &arguments->user, problem);
         default:
             arguments->help = true;
             return true;
@@ -90,6 +158,36 @@ bool TakesOption(const CommandRow& row, const std::string& option) {
     return (" " + std::string(row.options) + " ").find(" " + option + " ") != std::string::npos;
 }
 
+bool TakeSubject(const CommandRow& row, Arguments* arguments, std::string* problem) {
+    std::vector<std::string>& words = arguments->words;
+    const bool isNode = row.subject == Subject::kNode;
+    if (row.subject == Subject::kNothing) {
+        return true;
+    }
+    if (words.empty()) {
+        return Fail(problem,
+                    isNode ? "the appliance's number is missing" : "the account's name is missing");
+    }
+    arguments->name = words.front();
+    words.erase(words.begin());
+    return !isNode || ParseNode(arguments->name.c_str(), &arguments->node) ||
+           Fail(problem, "an appliance is a number from 1 up");
+}
+
+bool CheckNodeAdd(const Arguments& arguments, std::string* problem) {
+    const bool called = !arguments.url.empty();
+    if (called != (arguments.self != 0)) {
+        return Fail(problem, "--url and --self go together");
+    }
+    if (!called && !(arguments.authority.empty() && arguments.pin.empty())) {
+        return Fail(problem, "--authority and --pin go with --url");
+    }
+    if (!arguments.accept && !arguments.classes.empty()) {
+        return Fail(problem, "--class goes with --accept");
+    }
+    return called || arguments.accept || Fail(problem, "--url or --accept is missing");
+}
+
 bool Check(const CommandRow& row, const std::vector<std::string>& given, Arguments* arguments,
            std::string* problem) {
     for (const std::string& option : given) {
@@ -97,19 +195,18 @@ bool Check(const CommandRow& row, const std::vector<std::string>& given, Argumen
             return Fail(problem, "\"" + arguments->command + "\" takes no --" + option);
         }
     }
-    std::vector<std::string>& words = arguments->words;
-    if (row.takesName) {
-        if (words.empty()) {
-            return Fail(problem, "the account's name is missing");
-        }
-        arguments->name = words.front();
-        words.erase(words.begin());
+    if (!TakeSubject(row, arguments, problem)) {
+        return false;
     }
+    const std::vector<std::string>& words = arguments->words;
     if (words.size() < row.leastWords) {
         return Fail(problem, "the privilege is missing");
     }
     if (words.size() > row.mostWords) {
         return Fail(problem, "\"" + words[row.mostWords] + "\" is one word too many");
+    }
+    if (arguments->command == "node add" && !CheckNodeAdd(*arguments, problem)) {
+        return false;
     }
     return (!arguments->none || words.empty()) || Fail(problem, "--none takes no groups");
 }
@@ -138,6 +235,10 @@ bool ParseArguments(int argc, char** argv, Arguments* arguments, std::string* pr
     }
     arguments->command = argv[optind];
     arguments->words.assign(argv + optind + 1, argv + argc);
+    if (arguments->command == "node" && !arguments->words.empty()) {
+        arguments->command += " " + arguments->words.front();
+        arguments->words.erase(arguments->words.begin());
+    }
     for (const CommandRow& row : kCommands) {
         if (arguments->command == row.command) {
             return Check(row, given, arguments, problem);

@@ -11,6 +11,14 @@ struct Arguments {
     std::string name;
     std::vector<std::string> words;  // behind the name
     std::string network;
+    long long node = 0;  // of a command about appliances, whose name begins with "node "
+    std::string url;
+    std::string authority;
+    std::string pin;
+    long long self = 0;
+    std::vector<std::string> classes;
+    std::string user;
+    bool accept = false;
     long long expiresInDays = -1;  // -1 for never
     bool admin = false;
     bool generate = false;

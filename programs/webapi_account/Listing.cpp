@@ -1,21 +1,10 @@
 #include "Listing.h"
 
-#include <json/json.h>
 #include <time.h>
 
-#include <algorithm>
+#include "Format.h"
 
 namespace {
-
-using Row = std::vector<std::string>;
-
-std::string Joined(const std::vector<std::string>& texts) {
-    std::string line;
-    for (const std::string& text : texts) {
-        line += line.empty() ? text : "," + text;
-    }
-    return line;
-}
 
 std::string Day(long long seconds) {
     const time_t when = seconds;
@@ -38,11 +27,7 @@ std::string PrivilegesOf(const talo::Account& account) {
     return line;
 }
 
-std::string OrDash(const std::string& text) {
-    return text.empty() ? "-" : text;
-}
-
-Row RowOf(const talo::Account& account) {
+TextRow RowOf(const talo::Account& account) {
     return {account.name,
             std::to_string(account.uid),
             account.locked ? "locked" : "open",
@@ -51,36 +36,14 @@ Row RowOf(const talo::Account& account) {
             OrDash(PrivilegesOf(account))};
 }
 
-Json::Value TextsOf(const std::vector<std::string>& texts) {
-    Json::Value array(Json::arrayValue);
-    for (const std::string& text : texts) {
-        array.append(text);
-    }
-    return array;
-}
-
 }  // namespace
 
 std::string ListingTable(const std::vector<talo::Account>& accounts) {
-    std::vector<Row> rows = {{"NAME", "UID", "STATE", "EXPIRES", "GROUPS", "PRIVILEGES"}};
+    std::vector<TextRow> rows = {{"NAME", "UID", "STATE", "EXPIRES", "GROUPS", "PRIVILEGES"}};
     for (const talo::Account& account : accounts) {
         rows.push_back(RowOf(account));
     }
-    std::vector<size_t> widths(rows[0].size(), 0);
-    for (const Row& row : rows) {
-        for (size_t column = 0; column < row.size(); ++column) {
-            widths[column] = std::max(widths[column], row[column].size());
-        }
-    }
-    std::string table;
-    for (const Row& row : rows) {
-        for (size_t column = 0; column < row.size(); ++column) {
-            const bool last = column + 1 == row.size();
-            table += row[column];
-            table += last ? "\n" : std::string(widths[column] + 2 - row[column].size(), ' ');
-        }
-    }
-    return table;
+    return TextTable(rows);
 }
 
 std::string ListingJson(const std::vector<talo::Account>& accounts) {
@@ -91,14 +54,12 @@ std::string ListingJson(const std::vector<talo::Account>& accounts) {
         entry["uid"] = account.uid;
         entry["locked"] = account.locked;
         entry["passwordExpires"] = Json::Int64(account.passwordExpires);
-        entry["groups"] = TextsOf(account.groups);
+        entry["groups"] = JsonTexts(account.groups);
         entry["privileges"] = Json::Value(Json::objectValue);
         for (const auto& privilege : account.privileges) {
-            entry["privileges"][privilege.first] = TextsOf(privilege.second);
+            entry["privileges"][privilege.first] = JsonTexts(privilege.second);
         }
         list.append(entry);
     }
-    Json::StreamWriterBuilder builder;
-    builder["indentation"] = "  ";
-    return Json::writeString(builder, list) + "\n";
+    return JsonLines(list);
 }

@@ -12,6 +12,7 @@
 namespace {
 
 constexpr size_t kMaxLine = 4096;
+constexpr char kPassword[] = "password";
 constexpr int kSignals[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 
 bool Fail(std::string* problem, const std::string& text) {
@@ -62,7 +63,7 @@ class HiddenTyping {
 };
 
 // Byte by byte: what follows the line is somebody else's.
-bool ReadLine(std::string* line, std::string* problem) {
+bool ReadLine(const std::string& what, std::string* line, std::string* problem) {
     std::string text;
     for (char byte = 0; text.size() <= kMaxLine;) {
         const ssize_t got = read(STDIN_FILENO, &byte, 1);
@@ -70,10 +71,10 @@ bool ReadLine(std::string* line, std::string* problem) {
             continue;
         }
         if (got < 0) {
-            return Fail(problem, std::string("cannot read the password: ") + strerror(errno));
+            return Fail(problem, "cannot read the " + what + ": " + strerror(errno));
         }
         if (got == 0 && text.empty()) {
-            return Fail(problem, "no password was given");
+            return Fail(problem, "no " + what + " was given");
         }
         if (got == 0 || byte == '\n') {
             *line = text;
@@ -81,27 +82,28 @@ bool ReadLine(std::string* line, std::string* problem) {
         }
         text += byte;
     }
-    return Fail(problem, "the password is too long");
+    return Fail(problem, "the " + what + " is too long");
 }
 
-bool Ask(const char* question, std::string* answer, std::string* problem) {
+bool Ask(const char* question, const char* what, std::string* answer, std::string* problem) {
     const HiddenTyping hidden;
     if (!hidden.Works()) {
         return Fail(problem, "cannot hide what is typed");
     }
     std::cerr << question << std::flush;
-    return ReadLine(answer, problem);
+    return ReadLine(what, answer, problem);
 }
 
 }  // namespace
 
 bool ReadNewPassword(std::string* password, std::string* problem) {
     if (isatty(STDIN_FILENO) == 0) {
-        return ReadLine(password, problem);
+        return ReadLine(kPassword, password, problem);
     }
     std::string first;
     std::string second;
-    if (!Ask("New password: ", &first, problem) || !Ask("Again: ", &second, problem)) {
+    if (!Ask("New password: ", kPassword, &first, problem) ||
+        !Ask("Again: ", kPassword, &second, problem)) {
         return false;
     }
     if (first != second) {
@@ -109,6 +111,12 @@ bool ReadNewPassword(std::string* password, std::string* problem) {
     }
     *password = first;
     return true;
+}
+
+bool ReadSecret(std::string* secret, std::string* problem) {
+    constexpr char kSecret[] = "secret";
+    return isatty(STDIN_FILENO) == 0 ? ReadLine(kSecret, secret, problem)
+                                     : Ask("Secret: ", kSecret, secret, problem);
 }
 
 bool GeneratePassword(std::string* password, std::string* problem) {

@@ -4,6 +4,7 @@
 
 #include "Arguments.h"
 #include "Listing.h"
+#include "Nodes.h"
 #include "PasswordInput.h"
 #include "hosts/linux/sdk/Accounts.h"
 #include "hosts/linux/sdk/Cipher.h"
@@ -15,7 +16,7 @@ enum ExitStatus { kSuccess = 0, kFailure = 1, kWrongUsage = 2 };
 const char kUsage[] =
     "usage: webapi-account COMMAND [NAME] [ARGUMENT ...] [OPTION ...]\n"
     "\n"
-    "Manages who may log in to the web API.\n"
+    "Manages who may log in to the web API, and which other appliances it knows.\n"
     "\n"
     "  add NAME                    make an account\n"
     "      --admin                 in the group \"administrators\"\n"
@@ -34,6 +35,23 @@ const char kUsage[] =
     "  rotate-key                  make another key for clients that encipher parameters;\n"
     "                              the one before counts for another day\n"
     "  --help                      print this\n"
+    "\n"
+    "Other appliances, each by a number of your choice (docs/relay.md):\n"
+    "\n"
+    "  node add ID                 say how to reach it, what it may do here, or both; what\n"
+    "                              was said of the other stays\n"
+    "      --url URL --self ID     call it there, where this appliance has that number; asks\n"
+    "                              for the secret, which \"node add --accept\" printed there\n"
+    "      --authority FILE        with a certificate of these authorities, not the system's\n"
+    "      --pin PIN               with that public key: sha256//BASE64\n"
+    "      --accept                let it act for users here; prints the secret for it, once\n"
+    "      --class CLASS           only for users of a class, normal.local unless given; may\n"
+    "                              be repeated\n"
+    "  node list                   print all appliances, without secrets\n"
+    "      --json                  as a JSON array\n"
+    "  node remove ID              forget it; its sessions here count no more\n"
+    "  node test ID                call it, as for the user of this process\n"
+    "      --user NAME             as for that user\n"
     "\n"
     "add and passwd ask for the password on the terminal, or read it as one line from a\n"
     "standard input that is no terminal. With --generate they make one and print it.\n"
@@ -123,6 +141,9 @@ bool Run(const Arguments& arguments, std::string* problem) {
     }
     if (command == "rotate-key") {
         return talo::RotateCipherKey(problem);
+    }
+    if (arguments.command.rfind("node ", 0) == 0) {
+        return RunNodeCommand(arguments, problem);
     }
     return List(arguments, problem);
 }

@@ -5,17 +5,17 @@
 
 # shellcheck disable=SC2034  # used by the scripts that read this file
 packages_build=(g++ cmake ninja-build libjsoncpp-dev libcrypt-dev
-    libsqlite3-dev libssl-dev libarchive-dev libidn2-dev media-types)
+    libsqlite3-dev libssl-dev libarchive-dev libidn2-dev libcurl4-openssl-dev media-types)
 # shellcheck disable=SC2034
 packages_test=(ccache libgtest-dev libgmock-dev python3 nodejs git curl pkg-config util-linux
-    lighttpd nginx fcgiwrap apache2-bin libapache2-mod-xsendfile)
+    lighttpd lighttpd-mod-openssl openssl nginx fcgiwrap apache2-bin libapache2-mod-xsendfile)
 # shellcheck disable=SC2034
 packages_check=(clang clang-format clang-tidy libclang-rt-14-dev shellcheck)
 
 # What a web server needs: packages_of_server lighttpd|nginx|apache
 packages_of_server() {
     case $1 in
-        lighttpd) echo lighttpd ;;
+        lighttpd) echo lighttpd lighttpd-mod-openssl ;;
         nginx) echo nginx fcgiwrap ;;
         apache) echo apache2-bin libapache2-mod-xsendfile ;;
     esac

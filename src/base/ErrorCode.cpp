@@ -5,7 +5,8 @@ namespace TALO {
 const ErrorCodeRow kErrorCodes[] = {
     {kErrorBadRequest,
      "bad request: environment or parameters unreadable, API name or method "
-     "missing, version below 1, or a relay parameter where relay is not allowed"},
+     "missing, version below 1, or a relay parameter that names no appliance or "
+     "where relay is not allowed"},
     {kErrorNoSuchAPI, "no description for the API"},
     {kErrorNoSuchMethod, "method not listed for that version"},
     {kErrorVersion, "version out of the API's range"},

@@ -1,10 +1,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
-#include <vector>
 
 #include "platform/Cgi.h"
-#include "platform/WebAPIUtil.h"
 #include "src/base/ErrorCode.h"
 #include "src/base/JsonConvert.h"
 #include "src/request/APIRequestPrivate.h"
@@ -81,26 +79,25 @@ bool WebEntry::InitPostParam(Json::Value& postParam) {
 }
 
 bool WebEntry::DetectAndDecryptParamLine(const std::string& line, Json::Value& params) {
-    std::vector<char> copy(line.c_str(), line.c_str() + line.size() + 1);
-    if (TaloCgiDetectAndDecryptParamLine(copy.data()) == 0 ||
-        !WebAPIUtil::strPairToJsonObj(copy.data(), params, true, true)) {
+    if (!MergeDeciphered(line, TaloCgiDetectAndDecryptParamLine, params)) {
         return false;
     }
     if (!params.empty() && !DecryptAESParam(params)) {
         return false;
     }
+    // What an inner request lacks is found out by whoever runs it.
     Json::Value* nested = NestedObject(params);
     std::string text;
-    if (nested != nullptr && TakeCarrier(*nested, kCipherText, &text) != Carrier::kAbsent) {
+    if (nested != nullptr && TakeCarrier(*nested, kCipherText, &text)) {
         (void)DecryptParam(text, *nested);
-        (void)TakeCarrier(*nested, kCipherToken, nullptr);
+        (void)TakeCarrier(*nested, kCipherToken, &text);
     }
     return true;
 }
 
-// No cipher is on board: what a carrier held is missing.
-bool WebEntry::DecryptParam(const std::string&, Json::Value&) {
-    return false;
+bool WebEntry::DecryptParam(const std::string& text, Json::Value& params) {
+    return MergeDeciphered(text, TaloCgiDecryptParam, params) &&
+           (params.empty() || DecryptAESParam(params));
 }
 
 bool WebEntry::DecryptAESParam(Json::Value& params) {

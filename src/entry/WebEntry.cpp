@@ -125,11 +125,6 @@ void WebEntry::AdoptSessionParameter() {
     request->InitEnv(document);
 }
 
-bool WebEntry::ProcessRelay(APIRequest*, APIResponse* response) {
-    response->SetError(kErrorRelay, Json::Value());
-    return false;
-}
-
 int WebEntry::HandleCallback(APIResponse* response) {
     if (response == nullptr || response->GetCallbackFuncs() == nullptr ||
         response->GetCallbackFuncs()->empty()) {

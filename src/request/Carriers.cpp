@@ -1,8 +1,20 @@
 #include "src/request/Carriers.h"
 
+#include <vector>
+
+#include "platform/Cgi.h"
+#include "platform/CredRequest.h"
+#include "platform/WebAPIUtil.h"
 #include "src/base/JsonConvert.h"
 
 namespace TALO {
+
+namespace {
+
+// The text of a key and its final zero.
+constexpr size_t kKeyBytes = 33;
+
+}  // namespace
 
 const char kCipherText[] = "__cIpHeRtExT";
 const char kCipherToken[] = "__cIpHeRtOkEn";
@@ -10,17 +22,14 @@ const char kAESText[] = "__tXeTrEhPiC";
 const char kAESToken[] = "__nEkOtReHpIc";
 const char kNestedObject[] = "webapi";
 
-Carrier TakeCarrier(Json::Value& params, const char* name, std::string* text) {
+bool TakeCarrier(Json::Value& params, const char* name, std::string* text) {
     const Json::Value* found = FindMember(&params, name);
     if (found == nullptr) {
-        return Carrier::kAbsent;
+        return false;
     }
-    const bool readable = found->isString();
-    if (readable && text != nullptr) {
-        *text = found->asString();
-    }
+    *text = ToText(*found);
     params.removeMember(name);
-    return readable ? Carrier::kText : Carrier::kUnreadable;
+    return true;
 }
 
 Json::Value* NestedObject(Json::Value& params) {
@@ -28,14 +37,28 @@ Json::Value* NestedObject(Json::Value& params) {
     return found != nullptr && found->isObject() ? &params[kNestedObject] : nullptr;
 }
 
+bool MergeDeciphered(const std::string& text, int (*decipher)(char*), Json::Value& params) {
+    std::vector<char> copy(text.c_str(), text.c_str() + text.size() + 1);
+    return decipher(copy.data()) != 0 &&
+           WebAPIUtil::strPairToJsonObj(copy.data(), params, true, true);
+}
+
 bool DecryptAESCarriers(Json::Value& params) {
     if (FindMember(&params, kAESToken) == nullptr || FindMember(&params, kAESText) == nullptr) {
         return true;
     }
-    // No cipher is on board: the carriers go, and what they held is missing.
-    (void)TakeCarrier(params, kAESToken, nullptr);
-    (void)TakeCarrier(params, kAESText, nullptr);
-    return false;
+    std::string token;
+    std::string text;
+    (void)TakeCarrier(params, kAESToken, &token);
+    (void)TakeCarrier(params, kAESText, &text);
+    if (token.empty() || text.empty()) {
+        return false;
+    }
+    char key[kKeyBytes] = {};
+    std::string line;
+    return TALONdtokenGenerateToken(token.c_str(), key, sizeof key) >= 0 &&
+           CredRequestUtil::GetDecryptAESString(key, text, line) &&
+           WebAPIUtil::strPairToJsonObj(line, params, true, true);
 }
 
 }  // namespace TALO

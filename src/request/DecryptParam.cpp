@@ -1,17 +1,30 @@
+#include "platform/Cgi.h"
+#include "platform/WebAPIUtil.h"
 #include "src/request/APIRequestPrivate.h"
 #include "src/request/Carriers.h"
 
 namespace TALO {
 
+// Goes down the nested objects. What a client can send in one piece is no deeper
+// than the bound; an enciphered line could hang another such piece to the deepest
+// object of the one before, and so on. Nobody reads what is further down.
 bool APIRequestPrivate::DecryptParam(Json::Value& params) {
-    if (TakeCarrier(params, kCipherText, nullptr) != Carrier::kAbsent) {
-        return false;
+    Json::Value* object = &params;
+    for (size_t depth = 0; depth <= WebAPIUtil::kMaxJsonDepth; ++depth) {
+        std::string text;
+        if (TakeCarrier(*object, kCipherText, &text) &&
+            !MergeDeciphered(text, TaloCgiDecryptParam, *object)) {
+            return false;
+        }
+        if (!object->empty() && !DecryptAESParam(*object)) {
+            return false;
+        }
+        object = NestedObject(*object);
+        if (object == nullptr) {
+            return true;
+        }
     }
-    if (!params.empty() && !DecryptAESParam(params)) {
-        return false;
-    }
-    Json::Value* nested = NestedObject(params);
-    return nested == nullptr || DecryptParam(*nested);
+    return false;
 }
 
 bool APIRequestPrivate::DecryptAESParam(Json::Value& params) {

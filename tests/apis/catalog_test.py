@@ -6,7 +6,7 @@ import unittest
 import appliance
 from appliance import ApplianceTest, catalog
 
-SHIPPED = ("TALO.Catalog", "TALO.Entry.Request", "TALO.Session", "TALO.System",
+SHIPPED = ("TALO.Catalog", "TALO.Entry.Request", "TALO.Relay", "TALO.Session", "TALO.System",
            "TALO.Task")
 DESCRIPTION = {"lib": "lib/none.so", "minVersion": 1, "maxVersion": 1, "methods": {"1": ["run"]}}
 

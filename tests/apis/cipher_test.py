@@ -2,53 +2,15 @@
 
 import base64
 import concurrent.futures
-import json
 import os
-import pathlib
-import shutil
 import stat
 import subprocess
 import time
 import unittest
 
 import appliance
-from appliance import ApplianceTest, ROOT, form, post, session
-
-CIPHER_DIR = ROOT / "var/lib/talo/cipher"
-SEEN_DIR = ROOT / "run/talo/cipher"
-KEYS = CIPHER_DIR / "keys"
-
-PROJECT = pathlib.Path(__file__).resolve().parents[2]
-CIPHER_JS = (PROJECT / "console/cipher.js").as_uri()
-WEBCRYPTO = (PROJECT / "tests/console/webcrypto.mjs").as_uri()
-PREFIX = "~talo-line.1~"
-
-
-def seal(line, key, when=None):
-    """What a browser makes of a parameter line."""
-    program = f"""
-        import {json.dumps(WEBCRYPTO)};
-        import {{encipherLine}} from {json.dumps(CIPHER_JS)};
-        const [key, line, time] = process.argv.slice(1);
-        process.stdout.write(await encipherLine(key, line, Number(time)));
-    """
-    process = subprocess.run(
-        ["node", "--no-warnings", "--input-type=module", "-e", program, "--", key, line,
-         str(time.time() if when is None else when)],
-        check=True, capture_output=True, timeout=60)
-    return process.stdout.decode("ascii")
-
-
-class CipherTest(ApplianceTest):
-    def setUp(self):
-        super().setUp()
-        self.forget_keys()
-        self.addCleanup(self.forget_keys)
-
-    @staticmethod
-    def forget_keys():
-        shutil.rmtree(CIPHER_DIR, ignore_errors=True)
-        shutil.rmtree(SEEN_DIR, ignore_errors=True)
+from appliance import form, post, session
+from cipher_case import CIPHER_DIR, CipherTest, KEYS, PREFIX, seal, under
 
 
 class Cipher(CipherTest):
@@ -203,6 +165,15 @@ class LoadedLibraries(CipherTest):
                                    session("cipher").data["key"]))
         self.assertIn("TALO.Session.so", text)
         self.assertIn("libcrypto", text)
+
+    def test_a_carrier_within_a_plain_one_does(self):
+        for carriers in ({"__cIpHeRtExT": seal("a=1", session("cipher").data["key"])},
+                         {"webapi": {"__cIpHeRtExT": seal("a=1", session("cipher").data["key"])}},
+                         under("t", "a=1")):
+            text = self.loaded_by(form({"api": "TALO.Session", "version": 1, "method": "info",
+                                        **carriers}))
+            self.assertIn("TALO.Session.so", text)
+            self.assertIn("libcrypto", text)
 
 
 if __name__ == "__main__":

@@ -37,21 +37,22 @@ class NeedsASession(ApplianceTest):
         leave_unused(sid, 31 * 60)
         for method in ("renew", "info", "list", "end"):
             with self.subTest(method):
-                self.refused(session(method, sid, handle="h"), 106)
+                self.refused_as(session(method, sid, handle="h"), 106, "timeout")
 
     def test_that_was_opened_at_this_address(self):
         sid = self.log_in("normal")
         for method in METHODS:
             with self.subTest(method):
-                self.refused(session(method, sid, {"REMOTE_ADDR": "203.0.113.5"}, handle="h"), 107)
+                self.refused_as(session(method, sid, {"REMOTE_ADDR": "203.0.113.5"}, handle="h"),
+                                107, "noprivilege")
         self.assertEqual(session("info", sid).data["address"], "192.0.2.1")
 
     def test_for_a_page_of_this_site(self):
         sid = self.log_in("normal")
         for method in METHODS:
             with self.subTest(method):
-                self.refused(session(method, sid, {"HTTP_ORIGIN": "http://evil.example"},
-                                     handle="h"), 105)
+                self.refused_as(session(method, sid, {"HTTP_ORIGIN": "http://evil.example"},
+                                        handle="h"), 105, "noprivilege")
         self.assertEqual(session_ids(), [sid])
 
     def test_of_an_account_that_may_still_log_in(self):

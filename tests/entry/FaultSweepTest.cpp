@@ -39,9 +39,12 @@ TEST_F(FaultSweep, LeavesAProperReplyWhateverFails) {
         GetMethod("echo", "&_sid=XYZ"),
         Post("api=Test.Entry&version=1&method=echo&_sid=XYZ").With("QUERY_STRING", "a=1"),
         Traced(GetMethod("restartOnly")),
+        Post("api=Test.Entry&version=1&method=echo&__cIpHeRtExT=sealed:a=1&__tXeTrEhPiC=under+t:b=2"
+             "&__nEkOtReHpIc=t&webapi={%22__cIpHeRtExT%22:%22sealed:c=3%22}"),
     };
     for (const char* operation :
          {"TaloCgiInit", "TaloCgiLoadInCookies", "TaloCgiDetectAndDecryptParamLine",
+          "TaloCgiDecryptParam", "TALONdtokenGenerateToken", "GetDecryptAESString",
           "strPairToJsonObj", "TLIBCProcFork", "ReadJsonFile", "TLIBCFileExist", "TLIBNetService",
           "TLIBCSysUnlink"}) {
         for (const Call& call : calls) {
@@ -57,9 +60,12 @@ TEST_F(FaultSweep, LeavesAProperReplyWhateverFails) {
 
 // The sweep would prove nothing if the operations were not used at all.
 TEST_F(FaultSweep, ReachesTheOperationsOfARequest) {
-    const Call call = Traced(GetMethod("restartOnly", "&_sid=XYZ"));
+    const Call call = Traced(GetMethod("restartOnly",
+                                       "&_sid=XYZ&__cIpHeRtExT=sealed:a=1"
+                                       "&__tXeTrEhPiC=under+t:b=2&__nEkOtReHpIc=t"));
     for (const char* operation :
          {"TaloCgiInit", "TaloCgiLoadInCookies", "TaloCgiDetectAndDecryptParamLine",
+          "TaloCgiDecryptParam", "TALONdtokenGenerateToken", "GetDecryptAESString",
           "strPairToJsonObj", "TLIBCProcFork", "ReadJsonFile", "TLIBCFileExist"}) {
         bool reached = false;
         (void)ServeFailing(call, operation, 1, &reached);

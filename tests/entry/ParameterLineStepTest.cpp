@@ -1,7 +1,6 @@
-#include <functional>
 #include <string>
+#include <vector>
 
-#include "src/base/ErrorCode.h"
 #include "tests/entry/EntryTest.h"
 #include "tests/support/Json.h"
 
@@ -32,8 +31,21 @@ TEST_F(ParameterLineStep, MergesIntoWhatIsThere) {
 }
 
 TEST_F(ParameterLineStep, MergesTheLineThatThePlatformDeciphered) {
-    fake::Now().decipheredLine = "a=1&b=x";
-    ExpectLine("something longer", true, R"({"a": 1, "b": "x"})");
+    ExpectLine("sealed:a=1&b=x", true, R"({"a": 1, "b": "x"})");
+    ExpectLine("sealed:a+b=%5B1%5D", true, R"({"a b": [1]})");
+    ExpectLine("sealed:a=2", true, R"({"a": 2, "c": 3})", R"({"a": 1, "c": 3})");
+    ExpectLine("sealed:", true, "{}");
+}
+
+TEST_F(ParameterLineStep, GivesThePlatformACopyOfTheLine) {
+    Inside({}, [](ProbeEntry& entry) {
+        const std::string line = "sealed:a=1";
+        Json::Value params(Json::objectValue);
+        EXPECT_TRUE(entry.DetectAndDecryptParamLine(line, params));
+        EXPECT_EQ(line, "sealed:a=1");
+        EXPECT_EQ(fake::Now().detectCalls, std::vector<std::string>{line});
+        EXPECT_TRUE(fake::Now().decryptCalls.empty());
+    });
 }
 
 TEST_F(ParameterLineStep, NeedsThePlatformsWord) {
@@ -51,51 +63,62 @@ TEST_F(ParameterLineStep, EndsTheLineAtANul) {
     ExpectLine(std::string("a=1\0&b=2", 8), true, R"({"a": 1})");
 }
 
+// A carrier of the appliance's own cipher at the top is left for the request.
+TEST_F(ParameterLineStep, ReadsWhatIsUnderATokenOnly) {
+    ExpectLine("a=1&__tXeTrEhPiC=under+t:a=2%26b=2&__nEkOtReHpIc=t", true, R"({"a": 2, "b": 2})");
+    ExpectLine("__tXeTrEhPiC=under+t:&__nEkOtReHpIc=t", true, "{}");
+    ExpectLine("a=1&__cIpHeRtExT=sealed:b=2", true, R"({"a": 1, "__cIpHeRtExT": "sealed:b=2"})");
+    ExpectLine("sealed:__tXeTrEhPiC=under+t:b=2&__nEkOtReHpIc=t", true, R"({"b": 2})");
+}
+
+TEST_F(ParameterLineStep, ReadsACarrierOfWhatTheObjectHadBefore) {
+    ExpectLine("__nEkOtReHpIc=t", true, R"({"b": 2})", R"({"__tXeTrEhPiC": "under t:b=2"})");
+}
+
 TEST_F(ParameterLineStep, LeavesACarrierWithoutItsCompanion) {
     ExpectLine("a=1&__tXeTrEhPiC=t", true, R"({"a": 1, "__tXeTrEhPiC": "t"})");
     ExpectLine("a=1&__nEkOtReHpIc=t", true, R"({"a": 1, "__nEkOtReHpIc": "t"})");
 }
 
+TEST_F(ParameterLineStep, HasNoTokenStepForAnEmptyObject) {
+    Inside({}, [](ProbeEntry& entry) {
+        Json::Value params(Json::objectValue);
+        EXPECT_TRUE(entry.DetectAndDecryptParamLine("", params));
+        EXPECT_EQ(params, Json::Value(Json::objectValue));
+        EXPECT_TRUE(fake::Now().keyCalls.empty());
+    });
+}
+
 // Nobody may take what an enciphered part held for absent and go on.
 TEST_F(ParameterLineStep, RemovesBothCarriersAndFailsWhenTheyHoldNothingReadable) {
-    for (const char* values : {"__tXeTrEhPiC=&__nEkOtReHpIc=", "__tXeTrEhPiC=t&__nEkOtReHpIc=",
-                               "__tXeTrEhPiC=&__nEkOtReHpIc=t", "__tXeTrEhPiC=7&__nEkOtReHpIc=t",
-                               "__tXeTrEhPiC=t&__nEkOtReHpIc=[]"}) {
+    for (const char* values :
+         {"__tXeTrEhPiC=&__nEkOtReHpIc=", "__tXeTrEhPiC=t&__nEkOtReHpIc=",
+          "__tXeTrEhPiC=&__nEkOtReHpIc=t", "__tXeTrEhPiC=7&__nEkOtReHpIc=t",
+          "__tXeTrEhPiC=under+t:b=2&__nEkOtReHpIc=[]", "__tXeTrEhPiC=under+u:b=2&__nEkOtReHpIc=t",
+          "__tXeTrEhPiC={}&__nEkOtReHpIc=null"}) {
         ExpectLine(std::string("a=1&") + values, false, R"({"a": 1})");
     }
 }
 
-TEST_F(ParameterLineStep, RemovesTheCarriersOfANestedObject) {
-    ExpectLine(R"(webapi={"__cIpHeRtExT":"c","__cIpHeRtOkEn":"t","a":1})", true,
-               R"({"webapi": {"a": 1}})");
-    ExpectLine(R"(webapi={"__cIpHeRtExT":7,"__cIpHeRtOkEn":{},"a":1})", true,
-               R"({"webapi": {"a": 1}})");
+TEST_F(ParameterLineStep, FailsWhereverTheTokenStepFails) {
+    const struct {
+        const char* operation;
+        int nth;
+    } rows[] = {
+        {"TALONdtokenGenerateToken", 1}, {"GetDecryptAESString", 1}, {"strPairToJsonObj", 2}};
+    for (const auto& row : rows) {
+        fake::Now().failAt = {};
+        fake::Now().FailCall(row.operation, row.nth);
+        ExpectLine("a=1&__tXeTrEhPiC=under+t:b=2&__nEkOtReHpIc=t&webapi={%22__cIpHeRtExT%22:7}",
+                   false, R"({"a": 1, "webapi": {"__cIpHeRtExT": 7}})");
+    }
 }
 
-TEST_F(ParameterLineStep, LooksAtANestedObjectForItsCipherTextOnly) {
-    ExpectLine(R"(webapi={"__cIpHeRtOkEn":"t"})", true, R"({"webapi": {"__cIpHeRtOkEn": "t"}})");
-    ExpectLine(R"(webapi={"__tXeTrEhPiC":"t","__nEkOtReHpIc":"t"})", true,
-               R"({"webapi": {"__tXeTrEhPiC": "t", "__nEkOtReHpIc": "t"}})");
-}
-
-TEST_F(ParameterLineStep, TakesANestedNonObjectForAPlainParameter) {
-    ExpectLine("webapi=[1]", true, R"({"webapi": [1]})");
-    ExpectLine("webapi=text", true, R"({"webapi": "text"})");
-    ExpectLine("webapi=null", true, R"({"webapi": null})");
-}
-
-TEST_F(ParameterLineStep, NeverLetsACarrierReachTheMethod) {
-    const Reply reply = Serve(GetMethod("echo",
-                                        "&__cIpHeRtExT=c&webapi={%22__cIpHeRtExT%22:%22c%22,"
-                                        "%22__cIpHeRtOkEn%22:%22t%22}"));
-    ASSERT_EQ(reply.Code(), 0) << reply.output;
-    EXPECT_EQ(reply.bodyText.find("__"), std::string::npos) << reply.bodyText;
-}
-
-TEST_F(ParameterLineStep, AnswersAnEncipheredBodyThatCannotBeReadWith101) {
-    const Reply reply =
-        Serve(Post("api=Test.Entry&version=1&method=echo&__tXeTrEhPiC=&__nEkOtReHpIc="));
-    EXPECT_EQ(reply.Code(), TALO::kErrorBadRequest);
+TEST_F(ParameterLineStep, LeavesAnEncipheredLineThatItCannotOpen) {
+    fake::Now().FailCall("strPairToJsonObj", 1);
+    ExpectLine("sealed:a=1", false, R"({"b": 2})", R"({"b": 2})");
+    fake::Now().FailCall("TaloCgiDetectAndDecryptParamLine", 1);
+    ExpectLine("sealed:a=1", false, R"({"b": 2})", R"({"b": 2})");
 }
 
 }  // namespace

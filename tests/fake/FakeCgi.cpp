@@ -112,15 +112,4 @@ int TaloCgiUIDGet(const char* sessionId, const char* userName) {
                                                                                   : found->second;
 }
 
-int TaloCgiDetectAndDecryptParamLine(char* line) {
-    if (fake::Now().Called("TaloCgiDetectAndDecryptParamLine") || line == nullptr) {
-        return 0;
-    }
-    const std::string& deciphered = fake::Now().decipheredLine;
-    if (!deciphered.empty() && deciphered.size() <= strlen(line)) {
-        strcpy(line, deciphered.c_str());
-    }
-    return 1;
-}
-
 }  // extern "C"

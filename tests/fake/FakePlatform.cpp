@@ -1,5 +1,6 @@
 #include "tests/fake/FakePlatform.h"
 
+#include "tests/fake/FakeRelay.h"
 #include "tests/fake/FakeTask.h"
 
 namespace fake {
@@ -15,6 +16,7 @@ Platform& Now() {
 void Reset() {
     platform = Platform();
     ResetTasks();
+    ResetRelay();
 }
 
 void Platform::FailCall(const std::string& operation, int nth) {

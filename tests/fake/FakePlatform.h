@@ -67,6 +67,13 @@ struct PrivilegeCall {
     std::string remoteIP;
 };
 
+// One call of TALONdtokenGenerateToken.
+struct KeyCall {
+    std::string token;
+    size_t size;
+    bool bufferWasZero;
+};
+
 struct TouchCall {
     std::string path;
     int now;
@@ -144,8 +151,16 @@ struct Platform {
     std::set<std::string> administrators;                // user names
     std::map<std::string, std::string> userPreference;   // user to folder
     std::map<std::string, std::string> groupPreference;  // group to folder
-    std::string
-        decipheredLine;  // what TaloCgiDetectAndDecryptParamLine leaves, "" for the line itself
+
+    // "sealed:LINE" stands for a line under the appliance's own cipher, which opens
+    // it once; "under TOKEN:LINE" for one under the key of a token, "key of TOKEN".
+    std::set<std::string> sealedLinesSeen;
+    int cipherResult = 1;                   // what a success of the former answers
+    int keyResult = 0;                      // and one of TALONdtokenGenerateToken
+    std::vector<std::string> detectCalls;   // calls of TaloCgiDetectAndDecryptParamLine
+    std::vector<std::string> decryptCalls;  // calls of TaloCgiDecryptParam
+    std::vector<KeyCall> keyCalls;          // calls of TALONdtokenGenerateToken
+    std::vector<std::pair<std::string, std::string>> textCalls;  // key, text: GetDecryptAESString
 
     std::map<std::string, Session> sessions;  // by id
     std::string sessionDir = "/session";

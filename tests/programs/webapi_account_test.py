@@ -2,86 +2,17 @@
 
 import json
 import os
-import pathlib
-import pty
 import re
-import select
-import shutil
 import signal
-import subprocess
 import sys
 import termios
 import time
 import unittest
 
-PROGRAM, ROOT, MODULE = map(os.path.abspath, sys.argv[1:4])
-ACCOUNTS = pathlib.Path(ROOT, "etc/talo/accounts")
-MODULES = pathlib.Path(ROOT, "lib/talo")
-SUCCESS, FAILURE, WRONG_USAGE = 0, 1, 2
+from account_program import ACCOUNTS, FAILURE, MODULES, SUCCESS, ProgramTest, Terminal
 
 
-def run(*words, typed=""):
-    return subprocess.run([PROGRAM, *words], input=typed.encode(), stdout=subprocess.PIPE,
-                          stderr=subprocess.PIPE, timeout=60)
-
-
-class Terminal:
-    """The program on a terminal of its own."""
-
-    def __init__(self, *words):
-        self.child, self.screen = pty.fork()
-        if self.child == 0:
-            os.execv(PROGRAM, [PROGRAM, *words])
-        self.shown = b""
-
-    def wait_for(self, text):
-        deadline = time.monotonic() + 30
-        while text not in self.shown:
-            ready, _, _ = select.select([self.screen], [], [], deadline - time.monotonic())
-            if not ready:
-                raise AssertionError(f"never showed {text}: {self.shown}")
-            self.shown += os.read(self.screen, 1024)
-        self.shown = self.shown.split(text, 1)[1]
-
-    def type(self, text):
-        os.write(self.screen, text)
-
-    def end(self):
-        """Everything that was shown since, and the exit status (negative: a signal)."""
-        try:
-            while block := os.read(self.screen, 1024):
-                self.shown += block
-        except OSError:  # the terminal is gone with its last user
-            pass
-        _, status = os.waitpid(self.child, 0)
-        os.close(self.screen)
-        return self.shown, os.waitstatus_to_exitcode(status)
-
-
-class AccountProgram(unittest.TestCase):
-    def setUp(self):
-        shutil.rmtree(ROOT, ignore_errors=True)
-        MODULES.mkdir(parents=True)
-        (MODULES / "talo-password.so").symlink_to(MODULE)
-
-    def tearDown(self):
-        shutil.rmtree(ROOT, ignore_errors=True)
-
-    def done(self, *words, typed=""):
-        result = run(*words, typed=typed)
-        self.assertEqual(SUCCESS, result.returncode, result.stderr)
-        self.assertEqual(b"", result.stderr)
-        return result.stdout.decode()
-
-    def refused(self, *words, typed=""):
-        before = ACCOUNTS.read_bytes() if ACCOUNTS.exists() else None
-        result = run(*words, typed=typed)
-        self.assertEqual(FAILURE, result.returncode, words)
-        self.assertEqual(b"", result.stdout)
-        self.assertRegex(result.stderr, rb"^webapi-account: [^\n]+\n$")
-        self.assertEqual(before, ACCOUNTS.read_bytes() if ACCOUNTS.exists() else None)
-        return result.stderr.decode()
-
+class AccountProgram(ProgramTest):
     def accounts(self):
         return {entry["name"]: entry for entry in json.loads(self.done("list", "--json"))}
 
@@ -94,7 +25,7 @@ class AccountProgram(unittest.TestCase):
     def test_help_goes_to_standard_output(self):
         text = self.done("--help")
         for command in ("add", "passwd", "remove", "list", "lock", "unlock", "groups", "grant",
-                        "revoke", "--generate", "--admin", "--network", "--json"):
+                        "revoke", "rotate-key", "--generate", "--admin", "--network", "--json"):
             self.assertIn(command, text)
         self.assertEqual(text, self.done("add", "--help"))
         self.assertFalse(ACCOUNTS.exists())
@@ -108,10 +39,7 @@ class AccountProgram(unittest.TestCase):
                       ("grant", "anna", "a", "--network"), ("grant", "anna", "a", "--network", ""),
                       ("groups", "anna", "staff", "--none"), ("passwd", "anna", "--expires", "x"),
                       ("passwd", "anna", "--expires", "-1"), ("passwd", "anna", "--expires", "")):
-            result = run(*words, typed="secret\n")
-            self.assertEqual(WRONG_USAGE, result.returncode, words)
-            self.assertEqual(b"", result.stdout, words)
-            self.assertIn(b"usage: webapi-account", result.stderr, words)
+            self.misused(*words)
         self.assertFalse(ACCOUNTS.exists())
 
     def test_add_reads_one_line_from_a_pipe(self):

@@ -1,21 +1,15 @@
 #include "hosts/linux/account/AccountFile.h"
 
-#include <errno.h>
-#include <fcntl.h>
 #include <string.h>
-#include <sys/file.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <limits>
 #include <set>
 
-#include "hosts/linux/util/Descriptor.h"
 #include "hosts/linux/util/HostLog.h"
-#include "hosts/linux/util/SmallFile.h"
+#include "hosts/linux/util/LineFile.h"
+#include "hosts/linux/util/LineObject.h"
 #include "hosts/linux/util/TrustedFile.h"
-#include "platform/System.h"
 
 namespace host {
 
@@ -27,21 +21,6 @@ constexpr unsigned kLastUid = std::numeric_limits<int>::max();
 bool Refuse(std::string* problem, const std::string& text) {
     *problem = text;
     return false;
-}
-
-// Calls `visit` with the number and the bytes of each line, blank ones left
-// out, until it answers false.
-template <typename Visit>
-void ForEachLine(const std::string& content, Visit visit) {
-    size_t number = 0;
-    for (size_t start = 0; start < content.size();) {
-        const size_t end = std::min(content.find('\n', start), content.size());
-        ++number;
-        if (content.find_first_not_of(" \t\r", start) < end && !visit(number, start, end)) {
-            return;
-        }
-        start = end + 1;
-    }
 }
 
 bool Understand(const std::string& path, const std::string& content, size_t number, size_t start,
@@ -62,15 +41,10 @@ bool MayName(const std::string& content, size_t start, size_t end, const std::st
            memchr(begin, '\\', end - start) != nullptr;
 }
 
-struct Place {
-    size_t start;
-    size_t end;  // of the text, without the line's end
-};
-
 // All lines of one account: the first counts, but all go when it goes.
-std::vector<Place> PlacesOf(const std::string& path, const std::string& content,
-                            const std::string& name) {
-    std::vector<Place> places;
+std::vector<LinePlace> PlacesOf(const std::string& path, const std::string& content,
+                                const std::string& name) {
+    std::vector<LinePlace> places;
     ForEachLine(content, [&](size_t number, size_t start, size_t end) {
         StoredAccount read;
         if (MayName(content, start, end, '"' + name + '"') &&
@@ -105,45 +79,9 @@ bool NextUid(const std::string& path, const std::string& content, unsigned* uid)
     return candidate < kLastUid;
 }
 
-int OpenLock(const std::string& path) {
-    const int file = open((path + ".lock").c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW,
-                          S_IRUSR | S_IWUSR);
-    if (file < 0) {
-        return -1;
-    }
-    while (flock(file, LOCK_EX) != 0) {
-        if (errno != EINTR) {
-            (void)close(file);
-            return -1;
-        }
-    }
-    return file;
-}
-
-using ContentChange = std::function<bool(std::string* content, std::string* problem)>;
-
 bool Edit(const std::string& path, const ContentChange& change, std::string* problem) {
-    if (TALOFSMkdirP(path.substr(0, path.rfind('/')).c_str(), 0, 1, -1, -1, 0755) < 0) {
-        return Refuse(problem, "cannot make the folder of " + path + ": " + strerror(errno));
-    }
-    const Descriptor lock(OpenLock(path));
-    if (lock.Get() < 0) {
-        return Refuse(problem, "cannot lock " + path + ": " + strerror(errno));
-    }
-    std::string content;
-    if (!ReadTrustedFile(path, kMaxAccountsBytes, &content)) {
-        return Refuse(problem, "cannot use " + path + "; the system log says why");
-    }
-    if (!change(&content, problem)) {
-        return false;
-    }
-    if (content.size() > kMaxAccountsBytes) {
-        return Refuse(problem, "the file of accounts is full");
-    }
-    if (!ReplaceFile(path, content)) {
-        return Refuse(problem, "cannot write " + path + ": " + strerror(errno));
-    }
-    return true;
+    return ChangeLineFile({path.c_str(), "file of accounts", kMaxAccountsBytes, ReadTrustedFile},
+                          change, problem);
 }
 
 }  // namespace
@@ -206,10 +144,7 @@ bool AppendToFile(const std::string& path, const std::string& name, const std::s
             members[kNameMember] = name;
             members[kUidMember] = uid;
             members[kHashMember] = hash;
-            if (!content->empty() && content->back() != '\n') {
-                *content += '\n';
-            }
-            *content += RenderAccountLine(members) + '\n';
+            AppendLine(content, RenderLineObject(members));
             return true;
         },
         problem);
@@ -219,12 +154,12 @@ bool RemoveFromFile(const std::string& path, const std::string& name, std::strin
     return Edit(
         path,
         [&](std::string* content, std::string* why) {
-            const std::vector<Place> places = PlacesOf(path, *content, name);
+            const std::vector<LinePlace> places = PlacesOf(path, *content, name);
             if (places.empty()) {
                 return Refuse(why, "there is no account \"" + name + "\"");
             }
             for (auto place = places.rbegin(); place != places.rend(); ++place) {
-                content->erase(place->start, place->end + 1 - place->start);
+                EraseLine(content, *place);
             }
             return true;
         },
@@ -236,11 +171,11 @@ bool ChangeInFile(const std::string& path, const std::string& name, const Member
     return Edit(
         path,
         [&](std::string* content, std::string* why) {
-            const std::vector<Place> places = PlacesOf(path, *content, name);
+            const std::vector<LinePlace> places = PlacesOf(path, *content, name);
             if (places.empty()) {
                 return Refuse(why, "there is no account \"" + name + "\"");
             }
-            const Place place = places.front();
+            const LinePlace place = places.front();
             StoredAccount read;
             Json::Value members;
             std::string reason;
@@ -250,7 +185,7 @@ bool ChangeInFile(const std::string& path, const std::string& name, const Member
                 return false;
             }
             // What would be skipped afterwards must not be written.
-            const std::string line = RenderAccountLine(members);
+            const std::string line = RenderLineObject(members);
             if (!ParseAccountLine(line.data(), line.data() + line.size(), &read, nullptr,
                                   &reason)) {
                 return Refuse(why, reason);

@@ -30,9 +30,6 @@ struct StoredAccount {
 bool ParseAccountLine(const char* begin, const char* end, StoredAccount* stored,
                       Json::Value* members, std::string* reason);
 
-// One line without its end.
-std::string RenderAccountLine(const Json::Value& members);
-
 }  // namespace host
 
 #endif

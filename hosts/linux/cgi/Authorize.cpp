@@ -4,11 +4,13 @@
 #include <exception>
 #include <string>
 
+#include "hosts/linux/cgi/Caller.h"
 #include "hosts/linux/cgi/CrossSite.h"
 #include "hosts/linux/cgi/RemoteAddress.h"
 #include "hosts/linux/cgi/SessionStore.h"
 #include "hosts/linux/cgi/State.h"
 #include "hosts/linux/sdk/Accounts.h"
+#include "hosts/linux/sdk/Nodes.h"
 #include "hosts/linux/util/HostLog.h"
 #include "platform/Cgi.h"
 
@@ -51,7 +53,8 @@ int CheckSession(const TALOCGI& ctx, const talo::Session& session, int mask, boo
         return kTimedOut;
     }
     talo::Account account;
-    if (!talo::FindAccount(session.user, &account) || account.locked) {
+    if (!talo::FindAccount(session.user, &account) || account.locked ||
+        (session.node != 0 && !talo::MayActFor(session.node, account))) {
         return kNoAccount;
     }
     return talo::IsAdministrator(account) ? kAdministrator : kUser;
@@ -73,6 +76,7 @@ int Authorize(TALOCGI* ctx, const char* sessionId, char* name, size_t size,
     memcpy(ctx->sessionFile, file.c_str(), file.size() + 1);
     ctx->state->session = session;
     ctx->state->timeoutText = std::to_string(session.timeout);
+    host::SetCaller(ctx, session);
     return result;
 }
 

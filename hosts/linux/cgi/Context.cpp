@@ -3,6 +3,7 @@
 #include <exception>
 #include <string>
 
+#include "hosts/linux/cgi/Caller.h"
 #include "hosts/linux/cgi/SessionStore.h"
 #include "hosts/linux/cgi/State.h"
 #include "hosts/linux/conf/KeyValueFile.h"
@@ -83,6 +84,7 @@ void TaloCgiFree(TALOCGI* ctx) {
     if (ctx == nullptr) {
         return;
     }
+    host::ForgetCaller(ctx);
     delete ctx->state;
     TLIBCSzHashFree(ctx->paramHash);
     std::memset(ctx, 0, sizeof *ctx);

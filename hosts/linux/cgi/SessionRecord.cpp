@@ -2,7 +2,10 @@
 
 #include <json/json.h>
 
+#include <limits>
+
 #include "hosts/linux/util/JsonGrammar.h"
+#include "hosts/linux/util/LineObject.h"
 
 namespace host {
 
@@ -18,6 +21,13 @@ std::string Text(const Json::Value& record, const char* key) {
     return value.isString() ? value.asString() : std::string();
 }
 
+// Without the appliance that it is bound to a session would be an ordinary one:
+// what is no number of one is not read as none.
+bool ReadNode(const Json::Value& record, long long* node) {
+    return !record.isMember("node") ||
+           ReadJsonInteger(record["node"], 1, std::numeric_limits<long long>::max(), node);
+}
+
 }  // namespace
 
 std::string FormatSessionRecord(const talo::Session& session) {
@@ -31,6 +41,9 @@ std::string FormatSessionRecord(const talo::Session& session) {
     record["skipAddress"] = session.skipAddress;
     record["handle"] = session.handle;
     record["created"] = static_cast<Json::Int64>(session.created);
+    if (session.node != 0) {
+        record["node"] = static_cast<Json::Int64>(session.node);
+    }
     Json::StreamWriterBuilder builder;
     builder["indentation"] = "";
     return Json::writeString(builder, record);
@@ -56,7 +69,7 @@ bool ParseSessionRecord(const std::string& text, talo::Session* session) {
                        : 0;
     read.skipAddress = record["skipAddress"].isBool() && record["skipAddress"].asBool();
     read.created = record["created"].isInt64() ? record["created"].asInt64() : 0;
-    if (read.user.empty() || read.handle.empty()) {
+    if (read.user.empty() || read.handle.empty() || !ReadNode(record, &read.node)) {
         return false;
     }
     *session = read;

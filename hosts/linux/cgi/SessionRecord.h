@@ -8,7 +8,8 @@
 namespace host {
 
 // A session as the text of its file, and back. False for a text that is no JSON
-// object, or lacks the user or the handle, or has them of another type.
+// object, or lacks the user or the handle, or has them of another type, or has a
+// "node" that is no appliance's number.
 std::string FormatSessionRecord(const talo::Session& session);
 bool ParseSessionRecord(const std::string& text, talo::Session* session);
 

@@ -148,6 +148,19 @@ bool HasTimedOut(const talo::Session& session, int defaultMinutes, long long now
     return now - session.lastUse > minutes * kSecondsPerMinute;
 }
 
+// Where there are no sessions yet no folder is made: it has to be the web API's.
+void EndSessionsOfNode(long long node) {
+    if (access(TALO_SESSION_DIR, F_OK) != 0) {
+        return;
+    }
+    ForEachName([&](const std::string& name) {
+        talo::Session session;
+        if (ReadSession(name, &session) && session.node == node) {
+            (void)talo::EndSession(name);
+        }
+    });
+}
+
 }  // namespace host
 
 namespace talo {

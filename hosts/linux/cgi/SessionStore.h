@@ -16,6 +16,9 @@ std::string SessionDir();
 // now.
 bool HasTimedOut(const talo::Session& session, int defaultMinutes, long long now);
 
+// Ends every session that the appliance has opened.
+void EndSessionsOfNode(long long node);
+
 }  // namespace host
 
 #endif

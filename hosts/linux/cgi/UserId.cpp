@@ -1,5 +1,6 @@
 #include "hosts/linux/account/Backend.h"
 #include "hosts/linux/sdk/Accounts.h"
+#include "hosts/linux/sdk/Nodes.h"
 #include "hosts/linux/sdk/Sessions.h"
 #include "platform/Cgi.h"
 
@@ -13,7 +14,8 @@ extern "C" int TaloCgiUIDGet(const char* sessionId, const char* userName) {
         talo::Session session;
         talo::Account account;
         return talo::FindSession(sessionId, &session) && session.user == userName &&
-                       talo::FindAccount(userName, &account)
+                       talo::FindAccount(userName, &account) &&
+                       (session.node == 0 || talo::MayActFor(session.node, account))
                    ? static_cast<int>(account.uid)
                    : -1;
     });

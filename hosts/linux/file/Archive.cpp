@@ -2,7 +2,7 @@
 
 #include "hosts/linux/file/ArchiveModule.h"
 #include "hosts/linux/file/Guard.h"
-#include "hosts/linux/file/Module.h"
+#include "hosts/linux/util/Module.h"
 
 namespace talo {
 

@@ -3,10 +3,10 @@
 #include <string>
 
 #include "hosts/linux/file/Guard.h"
-#include "hosts/linux/file/Module.h"
 #include "hosts/linux/net/Address.h"
 #include "hosts/linux/net/IdnModule.h"
 #include "hosts/linux/net/NameRules.h"
+#include "hosts/linux/util/Module.h"
 #include "hosts/linux/util/Utf8.h"
 #include "platform/System.h"
 

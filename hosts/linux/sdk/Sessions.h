@@ -19,6 +19,7 @@ struct Session {
     std::string privilege;     // web-API privilege text
     int timeout = 0;           // minutes without use, 0 for the appliance's default
     bool skipAddress = false;  // not bound to the address
+    long long node = 0;        // the appliance that acts for the user, 0 for none
     std::string handle;        // names the session to others than its owner; no secret
     long long created = 0;     // seconds since the epoch
     long long lastUse = 0;     // seconds since the epoch

@@ -21,7 +21,9 @@ bool Refuse(std::string* reason, const char* text) {
     return false;
 }
 
-bool IsTrusted(int file, std::string* reason) {
+enum class Readers { kAnybody, kOwner };
+
+bool IsTrusted(int file, Readers readers, std::string* reason) {
     struct stat facts = {};
     if (fstat(file, &facts) != 0) {
         return Refuse(reason, strerror(errno));
@@ -32,24 +34,35 @@ bool IsTrusted(int file, std::string* reason) {
     if ((facts.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
         return Refuse(reason, "others than its owner may write it");
     }
+    if (readers == Readers::kOwner && (facts.st_mode & (S_IRGRP | S_IROTH)) != 0) {
+        return Refuse(reason, "others than its owner may read it");
+    }
     return true;
 }
 
-}  // namespace
-
-bool ReadTrustedFile(const std::string& path, size_t most, std::string* content) {
+bool Read(const std::string& path, Readers readers, size_t most, std::string* content) {
     const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOFOLLOW));
     if (file.Get() < 0 && errno == ENOENT) {
         content->clear();
         return true;
     }
     std::string reason = file.Get() < 0 ? strerror(errno) : "";
-    if (file.Get() >= 0 && IsTrusted(file.Get(), &reason) &&
+    if (file.Get() >= 0 && IsTrusted(file.Get(), readers, &reason) &&
         ReadSmallFile(file.Get(), most, content, &reason)) {
         return true;
     }
     HOST_LOG("cannot use %s: %s", path.c_str(), reason.c_str());
     return false;
+}
+
+}  // namespace
+
+bool ReadTrustedFile(const std::string& path, size_t most, std::string* content) {
+    return Read(path, Readers::kAnybody, most, content);
+}
+
+bool ReadSecretFile(const std::string& path, size_t most, std::string* content) {
+    return Read(path, Readers::kOwner, most, content);
 }
 
 }  // namespace host

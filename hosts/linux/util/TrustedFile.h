@@ -13,6 +13,10 @@ namespace host {
 // untouched.
 bool ReadTrustedFile(const std::string& path, size_t most, std::string* content);
 
+// The same for a file with secrets: one that others than its owner may read is
+// refused too.
+bool ReadSecretFile(const std::string& path, size_t most, std::string* content);
+
 }  // namespace host
 
 #endif

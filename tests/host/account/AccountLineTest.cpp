@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "hosts/linux/account/AccountName.h"
+#include "hosts/linux/util/LineObject.h"
 
 namespace {
 
@@ -167,7 +168,7 @@ TEST(AccountLine, RendersOneLineWithEveryMember) {
     std::string reason;
     ASSERT_TRUE(
         host::ParseAccountLine(line.data(), line.data() + line.size(), &stored, &members, &reason));
-    EXPECT_EQ(line, host::RenderAccountLine(members));
+    EXPECT_EQ(line, host::RenderLineObject(members));
 }
 
 }  // namespace

@@ -121,6 +121,31 @@ TEST(SessionRecord, BelievesATimeoutOfAMinuteToAYear) {
     }
 }
 
+TEST(SessionRecord, KeepsTheApplianceThatActs) {
+    talo::Session session;
+    session.user = "u";
+    session.handle = "h";
+    EXPECT_EQ(host::FormatSessionRecord(session).find("node"), std::string::npos);
+    for (const long long node : {1LL, 2LL, 9223372036854775807LL}) {
+        session.node = node;
+        EXPECT_EQ(Parsed(host::FormatSessionRecord(session)).node, node);
+    }
+    EXPECT_EQ(Parsed(R"({"user":"u","handle":"h"})").node, 0);
+}
+
+// Read as none it would be an ordinary session.
+TEST(SessionRecord, IsRefusedWithAnApplianceThatIsNone) {
+    for (const char* value :
+         {"0", "-1", "1.0", "1.5", "1e2", "\"1\"", "\"\"", "true", "null", "[1]", "{}",
+          "9223372036854775808", "18446744073709551615", "-9223372036854775808", "1e300"}) {
+        talo::Session session;
+        session.user = "untouched";
+        EXPECT_FALSE(host::ParseSessionRecord(With("\"node\":" + std::string(value)), &session))
+            << value;
+        EXPECT_EQ(session.user, "untouched") << value;
+    }
+}
+
 // A right that is half understood is none.
 TEST(SessionRecord, IsExemptFromTheAddressOnlyByABoolean) {
     EXPECT_TRUE(Parsed(With(R"("skipAddress":true)")).skipAddress);

@@ -1,4 +1,4 @@
-#include "hosts/linux/file/Module.h"
+#include "hosts/linux/util/Module.h"
 
 #include <dlfcn.h>
 
