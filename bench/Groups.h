@@ -10,6 +10,8 @@ void Multipart();     // the parser of uploads against a copy
 void Uploads();       // a large upload against cat into a file
 void Downloads();     // a file into a pipe against cat
 void Tasks();         // the start, the status and the lists of background tasks
+void Ciphers();       // the deciphering of a parameter line
+void Relays();        // a call over another appliance against a direct one
 void ProcessStart();  // a whole entry.cgi process against a bare program
 
 }  // namespace bench

@@ -7,6 +7,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <utility>
 
 #include "platform/Paths.h"
 
@@ -19,19 +20,23 @@ namespace {
     std::exit(1);
 }
 
+std::vector<char*> Pointers(std::vector<std::string>* texts) {
+    std::vector<char*> pointers;
+    for (std::string& text : *texts) {
+        pointers.push_back(&text[0]);
+    }
+    pointers.push_back(nullptr);
+    return pointers;
+}
+
 // With its standard output as `actions` have it.
 pid_t Spawn(const std::string& program, std::vector<std::string>* environment,
-            posix_spawn_file_actions_t* actions) {
+            posix_spawn_file_actions_t* actions, std::vector<std::string> arguments = {}) {
     posix_spawn_file_actions_addopen(actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-    std::string name = program;
-    char* arguments[] = {&name[0], nullptr};
-    std::vector<char*> variables;
-    for (std::string& variable : *environment) {
-        variables.push_back(&variable[0]);
-    }
-    variables.push_back(nullptr);
+    arguments.insert(arguments.begin(), program);
     pid_t child = -1;
-    if (posix_spawn(&child, program.c_str(), actions, nullptr, arguments, variables.data()) != 0) {
+    if (posix_spawn(&child, program.c_str(), actions, nullptr, Pointers(&arguments).data(),
+                    Pointers(environment).data()) != 0) {
         GiveUp(program);
     }
     posix_spawn_file_actions_destroy(actions);
@@ -49,11 +54,12 @@ void Await(const std::string& program, pid_t child) {
 
 const char kEntry[] = TALO_WEBAPI_DIR "entry.cgi";
 
-void RunProcess(const std::string& program, std::vector<std::string> environment) {
+void RunProcess(const std::string& program, std::vector<std::string> environment,
+                std::vector<std::string> arguments) {
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
-    Await(program, Spawn(program, &environment, &actions));
+    Await(program, Spawn(program, &environment, &actions, std::move(arguments)));
 }
 
 std::string ReplyOf(const std::string& program, std::vector<std::string> environment) {

@@ -11,7 +11,8 @@ extern const char kEntry[];
 
 // Runs a process from its birth to its end with this environment, its output
 // thrown away. Ends the benchmark when it fails.
-void RunProcess(const std::string& program, std::vector<std::string> environment);
+void RunProcess(const std::string& program, std::vector<std::string> environment,
+                std::vector<std::string> arguments = {});
 
 // The same with its output kept.
 std::string ReplyOf(const std::string& program, std::vector<std::string> environment);

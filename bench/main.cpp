@@ -15,6 +15,7 @@ const Group kGroups[] = {
     {"process", bench::ProcessStart}, {"upload", bench::Uploads},
     {"sessions", bench::Sessions},    {"multipart", bench::Multipart},
     {"downloads", bench::Downloads},  {"tasks", bench::Tasks},
+    {"relay", bench::Relays},         {"ciphers", bench::Ciphers},
 };
 
 bool Wanted(const char* name, int argc, char** argv) {

@@ -1,14 +1,18 @@
 # shellcheck shell=bash
 # shellcheck disable=SC2154  # works on the variables of its caller
 # The parts of scripts/web-server. They work on its variables: root, run_dir,
-# webapi_dir, data_dir, service_program, server, port, bind, server_pid, wrapper_pid.
+# webapi_dir, data_dir, tls_file, service_program, server, port, bind, server_pid,
+# wrapper_pid.
 # Needs common.sh.
 
 # A UNIX socket's path is short; the web server appends a process id to it.
 max_socket_path=90
 
+# The status of curl for a certificate that is not trusted, or is not for the address.
+curl_refuses_certificate=60
+
 # Checks server, port and bind, and sets host (what a client writes in a URL),
-# listen (what the configuration says) and address (host and port).
+# listen (what the configuration says), address (host and port) and url.
 check_address() {
     case $server in
         lighttpd | nginx | apache) ;;
@@ -23,15 +27,26 @@ check_address() {
     [[ $host == *:* ]] && host="[$host]"
     [[ $listen == *:* ]] && listen="[$listen]"
     address=$host:$port
+    url=http${tls_file:+s}://$address
     if (exec 3<>"/dev/tcp/$client/$port") 2>/dev/null; then
         die "port $port of $bind is taken: choose another one with --port"
     fi
 }
 
+check_tls_file() {
+    [[ -r $tls_file ]] || die "cannot read '$tls_file'"
+    tls_file=$(realpath -- "$tls_file")
+    local block
+    for block in 'PRIVATE KEY' CERTIFICATE; do
+        grep -qsE -- "^-----BEGIN (EC |RSA )?$block-----" "$tls_file" ||
+            die "no ${block,,} in $tls_file"
+    done
+}
+
 # The paths end up between double quotes in configurations.
 prepare_run_dir() {
     local path
-    for path in "$root" "$run_dir" "$data_dir"; do
+    for path in "$root" "$run_dir" "$data_dir" "$tls_file"; do
         [[ $path =~ [[:cntrl:]\"\'\$\\%] ]] && die "a web server cannot work in '$path'"
     done
     if [[ -e $run_dir && ! -e $run_dir/.web-server ]] && [[ -n $(ls -A "$run_dir") ]]; then
@@ -56,6 +71,12 @@ write_configuration() {
     [[ $EUID -eq 0 ]] && user_line="user root;"
     text=$(<"$project/packaging/web-servers/$server.conf.in")
     [[ -z $data_dir ]] || text=${text//'#send-files# '/}
+    if [[ -n $tls_file ]]; then
+        text=${text//'#tls# '/}
+    else
+        text=${text//'#plain# '/}
+    fi
+    text=${text//@TLS_FILE@/"$tls_file"}
     text=${text//@DATA_DIR@/"$data_dir"}
     text=${text//@RUN_DIR@/"$run_dir"}
     text=${text//@SOCKET_DIR@/"$socket_dir"}
@@ -125,17 +146,22 @@ start_server() {
 }
 
 await_ready() {
-    local try
+    local try status trust=()
+    [[ -z $tls_file ]] || trust=(--cacert "$tls_file")
     for try in {1..200}; do
-        if curl --noproxy '*' -gfs -o "$run_dir/tmp/index" "http://$address/" 2>/dev/null; then
-            rm -f "$run_dir/tmp/index"
-            kill -0 "$server_pid" 2>/dev/null && return
-        fi
+        status=0
+        curl -q --noproxy '*' -gfsS "${trust[@]}" -o "$run_dir/tmp/index" "$url/" \
+            2>"$run_dir/tmp/problem" || status=$?
         kill -0 "$server_pid" 2>/dev/null || break
+        if [[ $status -eq 0 ]]; then
+            rm -f "$run_dir"/tmp/{index,problem}
+            return
+        fi
+        [[ $status -ne $curl_refuses_certificate ]] || break
         sleep 0.05
     done
     show_log
-    die "$server does not answer on $address ($try tries)"
+    die "$server does not answer on $address ($try tries)$(sed 's/^/: /;q' "$run_dir/tmp/problem")"
 }
 
 show_log() {
@@ -143,22 +169,24 @@ show_log() {
 }
 
 show_examples() {
-    local entry="http://$address/webapi/entry.cgi"
+    local entry="$url/webapi/entry.cgi" curl=curl trusted=${tls_file%.pem}.crt
+    [[ -e $trusted ]] || trusted=$tls_file
+    [[ -z $tls_file ]] || printf -v curl 'curl --cacert %q' "$trusted"
     cat <<END
 
 Try, in another terminal:
-  curl '$entry?api=TALO.System&version=1&method=ping&text=hi'
-  curl -c jar -d 'api=TALO.Session&version=1&method=open&account=admin' \\
+  $curl '$entry?api=TALO.System&version=1&method=ping&text=hi'
+  $curl -c jar -d 'api=TALO.Session&version=1&method=open&account=admin' \\
       --data-urlencode 'passwd="PASSWORD"' $entry
-  curl -b jar -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
+  $curl -b jar -d '{"api":"TALO.System","version":2,"method":"info"}' $entry
 END
     grep -qsF '"name": "public"' "$root/etc/talo/shares" || return 0
     cat <<END
-  curl -b jar -F file=@README.md '$entry?api=TALO.File&version=1&method=upload&path=/public'
-  curl -b jar -d 'api=TALO.File&version=1&method=list&folder=/public' $entry
-  curl -b jar -o copy.md '$entry?api=TALO.File&version=1&method=download&path=/public/README.md'
-  curl -b jar -d 'api=TALO.File.Checksum&version=1&method=start&path=/public' $entry
-  curl -b jar -d 'api=TALO.Task&version=1&method=status&task_id=TASK_ID' $entry
+  $curl -b jar -F file=@README.md '$entry?api=TALO.File&version=1&method=upload&path=/public'
+  $curl -b jar -d 'api=TALO.File&version=1&method=list&folder=/public' $entry
+  $curl -b jar -o copy.md '$entry?api=TALO.File&version=1&method=download&path=/public/README.md'
+  $curl -b jar -d 'api=TALO.File.Checksum&version=1&method=start&path=/public' $entry
+  $curl -b jar -d 'api=TALO.Task&version=1&method=status&task_id=TASK_ID' $entry
 END
 }
 

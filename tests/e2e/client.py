@@ -3,6 +3,7 @@
 import http.client
 import json
 import socket
+import ssl
 import urllib.parse
 
 ENTRY = "/webapi/entry.cgi"
@@ -38,12 +39,27 @@ def _refuse(constant):
 class Client:
     timeout = TIMEOUT
 
-    def __init__(self, host, port):
+    def __init__(self, host, port, authority=None):
+        """With a file of certificates the client speaks TLS, and trusts these."""
         self.host = host
         self.port = port
+        self._tls = ssl.create_default_context(cafile=authority) if authority else None
+
+    def connection(self):
+        if self._tls is None:
+            return http.client.HTTPConnection(self.host, self.port, timeout=self.timeout)
+        return http.client.HTTPSConnection(self.host, self.port, timeout=self.timeout,
+                                           context=self._tls)
+
+    def connect(self):
+        """A connected socket."""
+        plain = socket.create_connection((self.host, self.port), timeout=TIMEOUT)
+        if self._tls is None:
+            return plain
+        return self._tls.wrap_socket(plain, server_hostname=self.host)
 
     def request(self, method, path, body=None, headers=None):
-        connection = http.client.HTTPConnection(self.host, self.port, timeout=self.timeout)
+        connection = self.connection()
         try:
             connection.request(method, path, body, {"Connection": "close", **(headers or {})})
             return _read(connection.getresponse())
@@ -64,7 +80,7 @@ class Client:
 
     def raw(self, data, half_close=False):
         """The reply to these bytes; None when the server just closes."""
-        with socket.create_connection((self.host, self.port), timeout=TIMEOUT) as connection:
+        with self.connect() as connection:
             connection.sendall(data)
             if half_close:
                 connection.shutdown(socket.SHUT_WR)

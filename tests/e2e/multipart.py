@@ -3,9 +3,8 @@
 import hashlib
 import http.client
 import os
-import socket
 
-from client import ENTRY, TIMEOUT, Reply
+from client import ENTRY, Reply
 
 BOUNDARY = "--------------------------e2e7f1c04d93"
 TYPE = f"multipart/form-data; boundary={BOUNDARY}"
@@ -45,7 +44,7 @@ def file_digest(path):
 
 def body_digest(client, path):
     """The SHA-256 of what a GET brings, however much it is."""
-    connection = http.client.HTTPConnection(client.host, client.port, timeout=TIMEOUT)
+    connection = client.connection()
     try:
         connection.request("GET", path)
         response = connection.getresponse()
@@ -103,7 +102,7 @@ class Sender:
     """A POST whose body is sent step by step."""
 
     def __init__(self, client, query, length, headers=None):
-        self.socket = socket.create_connection((client.host, client.port), timeout=TIMEOUT)
+        self.socket = client.connect()
         lines = {"Host": client.host, "Connection": "close", "Content-Type": TYPE,
                  "Content-Length": str(length), **(headers or {})}
         head = f"POST {ENTRY}?{query} HTTP/1.1\r\n"

@@ -3,7 +3,6 @@
 import argparse
 import os
 import pathlib
-import re
 import shutil
 import signal
 import sys
@@ -17,39 +16,39 @@ from webserver import WebServer, processes_that_mention, wait_until  # noqa: E40
 
 MOUNTED = "WEBAPI_E2E_MOUNTED"
 SMALL_VOLUME_MEBIBYTES = 48
-SANITIZER = re.compile(r"ERROR: \w*Sanitizer|runtime error:")
 
 
 def install_test_apis(root, modules):
-    """Puts the test APIs beside the shipped ones; gives the list of the files."""
+    """Puts the test APIs beside the shipped ones."""
     webapi_dir = pathlib.Path(root) / "usr/talo/taloman/webapi"
-    installed = []
-    if not list(pathlib.Path(modules).glob("*.so")):
+    libraries = list(pathlib.Path(modules).glob("*.so"))
+    if not libraries:
         raise SystemExit(f"no API libraries in {modules}")
-    for source, folder in (
-            [(path, webapi_dir / "lib") for path in pathlib.Path(modules).glob("*.so")] +
-            [(path, webapi_dir) for path in HERE.parent.glob("modules/*.lib")] +
-            [(path, webapi_dir) for path in HERE.glob("*.lib")]):
-        installed.append(folder / source.name)
-        shutil.copy(source, installed[-1])
-    return installed
+    for path in libraries:
+        shutil.copy(path, webapi_dir / "lib")
+    for path in [*HERE.parent.glob("modules/*.lib"), *HERE.glob("*.lib")]:
+        shutil.copy(path, webapi_dir)
 
 
-def in_own_mounts(small_volume):
-    """Begins anew with a small file system on that folder, which ends with us.
-    Capabilities that this takes are given back before anything is tested."""
+def in_own_mounts(root, build, small_volume):
+    """Begins anew with an installation of our own in the root's place, and with a small
+    file system on that folder; both end with us, and nobody else sees them. Capabilities
+    that this takes are given back before anything is tested."""
     if MOUNTED in os.environ:
         return
+    os.makedirs(root, exist_ok=True)
     os.makedirs(small_volume, exist_ok=True)
     unshare = ["unshare", "--mount"]
     drop = ""
     if os.geteuid() != 0:
         unshare += ["--user", "--map-current-user", "--keep-caps"]
         drop = "setpriv --inh-caps=-all --ambient-caps=-all"
-    script = (f'mount -t tmpfs -o size={SMALL_VOLUME_MEBIBYTES}m,mode=777 none "$1" && shift && '
-              f'exec {drop} "$@"')
-    os.execvpe("unshare", [*unshare, "sh", "-c", script, "sh", small_volume, sys.executable, "-B",
-                           os.path.abspath(__file__), *sys.argv[1:]],
+    script = (f'mount -t tmpfs -o mode=755 none "$1" && '
+              f'env -u DESTDIR cmake --install "$2" >/dev/null && '
+              f'mount -t tmpfs -o size={SMALL_VOLUME_MEBIBYTES}m,mode=777 none "$3" && '
+              f'shift 3 && exec {drop} "$@"')
+    os.execvpe("unshare", [*unshare, "sh", "-c", script, "sh", root, build, small_volume,
+                           sys.executable, "-B", os.path.abspath(__file__), *sys.argv[1:]],
                {**os.environ, MOUNTED: "yes"})
 
 
@@ -69,15 +68,14 @@ def complaints_after(server, status):
         yield f"still running: {processes_that_mention(str(server.run_dir))}"
     if server.service_program.exists():
         yield f"{server.service_program} was left behind"
-    for line in server.logs().splitlines():
-        if SANITIZER.search(line):
-            yield line
+    yield from server.sanitizers()
 
 
 def main():
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("--server", required=True, choices=("lighttpd", "nginx", "apache"))
-    parser.add_argument("--root", required=True, help="the installed root")
+    parser.add_argument("--root", required=True, help="the root that the build was made for")
+    parser.add_argument("--build", required=True, help="the build's folder, to install from")
     parser.add_argument("--run-dir", required=True, help="the web server's own folder")
     parser.add_argument("--modules", required=True, help="folder of the test API libraries")
     parser.add_argument("--slow", action="store_true", help="the cases that take minutes")
@@ -85,21 +83,17 @@ def main():
     arguments = parser.parse_args()
     run_dir = os.path.abspath(arguments.run_dir)
     small_volume = f"{run_dir}-small-volume"
-    in_own_mounts(small_volume)
+    in_own_mounts(arguments.root, arguments.build, small_volume)
     Case.small_volume = pathlib.Path(small_volume)
 
-    installed = install_test_apis(arguments.root, arguments.modules)
+    install_test_apis(arguments.root, arguments.modules)
+    server = Case.server = WebServer(arguments.server, arguments.root, run_dir)
     try:
-        server = Case.server = WebServer(arguments.server, arguments.root, run_dir)
-        try:
-            files = "slow_*.py" if arguments.slow else "test_*.py"
-            passed = run_cases(files, arguments.pattern)
-        finally:
-            status = server.script.stop(signal.SIGTERM)
-        complaints = list(complaints_after(server, status))
+        files = "slow_*.py" if arguments.slow else "test_*.py"
+        passed = run_cases(files, arguments.pattern)
     finally:
-        for path in installed:
-            path.unlink(missing_ok=True)
+        status = server.script.stop(signal.SIGTERM)
+    complaints = list(complaints_after(server, status))
     for complaint in complaints:
         print(complaint, file=sys.stderr)
     if not passed:

@@ -118,5 +118,5 @@ class Refusals(Case):
         self.fails(self.client.post(body, query=form(**PING), headers={
             "Content-Type": "multipart/form-data; boundary=b"}), 115)
 
-    def test_a_relay_is_not_there(self):
-        self.fails(self.client.call("TALO.System", "ping", relay_nd="x"), 109)
+    def test_a_relay_takes_a_session(self):
+        self.fails(self.client.call("TALO.System", "ping", relay_nd=2), 119)

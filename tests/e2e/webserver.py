@@ -12,6 +12,7 @@ import time
 
 PROJECT = pathlib.Path(__file__).resolve().parents[2]
 HOST = "127.0.0.1"
+SANITIZER = re.compile(r"ERROR: \w*Sanitizer|runtime error:")
 
 
 def free_port():
@@ -71,7 +72,7 @@ class Foreground:
                 return False
             if line is None:
                 return False
-            if re.match(r"ready http://\S+/$", line):
+            if re.match(r"ready https?://\S+/$", line):
                 return True
 
     def is_alive(self):
@@ -84,10 +85,11 @@ class Foreground:
 
 
 class WebServer:
-    """Serves a root on a free loopback port."""
+    """Serves a root on a free loopback port. The words of `through` start the script."""
 
-    def __init__(self, name, root, run_dir, options=()):
+    def __init__(self, name, root, run_dir, options=(), through=()):
         self.name = name
+        self.through = list(through)
         self.options = [str(option) for option in options]
         self.root = pathlib.Path(root).resolve()
         self.run_dir = pathlib.Path(run_dir)
@@ -102,8 +104,9 @@ class WebServer:
         raise RuntimeError("no web server: " + "".join(self.script.output))
 
     def command(self):
-        return [str(PROJECT / "scripts/web-server"), "--server", self.name, "--port",
-                str(self.port), "--root", str(self.root), "--run-dir", str(self.run_dir), *self.options]
+        return [*self.through, str(PROJECT / "scripts/web-server"), "--server", self.name,
+                "--port", str(self.port), "--root", str(self.root), "--run-dir",
+                str(self.run_dir), *self.options]
 
     def restarts(self):
         """How often the server has finished a start or a restart, by its own log."""
@@ -113,3 +116,7 @@ class WebServer:
 
     def logs(self):
         return "".join(path.read_text(errors="replace") for path in self.run_dir.glob("*.log"))
+
+    def sanitizers(self):
+        """What sanitizers have found in the programs that the server ran."""
+        return [line for line in self.logs().splitlines() if SANITIZER.search(line)]
