@@ -15,7 +15,7 @@
 
 namespace {
 
-constexpr size_t kMostBytes = 32 * 1024;  // that a socket takes at once
+constexpr size_t kMostBytes = size_t{32} * 1024;  // that a socket takes at once
 constexpr size_t kBlockLimit = 4096;
 
 void Require(bool condition) {

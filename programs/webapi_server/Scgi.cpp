@@ -165,7 +165,8 @@ ScgiResult ParseBlock(const std::string& block, std::vector<std::string>* variab
             }
             hasVersion = true;
         }
-        found.push_back(name + "=" + value);
+        name += '=';
+        found.push_back(name + value);
     }
     if (!hasVersion) {
         return Malformed(reason, found.empty() ? "there are no variables" : "SCGI is missing");

@@ -70,7 +70,7 @@ void SendAll(int connection, const ErrorReply& reply) {
 // keeps open does not have. Where all of the body is here already, its end is made;
 // a small one that is just coming is waited for.
 void EndInputBehindBody() {
-    constexpr long long kSmall = 64 * 1024;
+    constexpr long long kSmall = 64LL * 1024;
     constexpr int kMostMilliseconds = 1000;
     const char* const text = getenv("CONTENT_LENGTH");
     const long long length = strtoll(text != nullptr ? text : "0", nullptr, 10);

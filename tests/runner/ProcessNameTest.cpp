@@ -234,7 +234,7 @@ TEST_F(ProcessName, GoesBackToTheStartNameInTheEnd) {
 
 // A process with many requests: cut names must not be cut again.
 TEST_F(ProcessName, IsTheSameForEveryRequestOfAProcess) {
-    runner::InChild([this] {
+    runner::InChild([] {
         ProgramName program("/lib/prog");
         for (int round = 0; round < 12; ++round) {
             runner::OpenRunner runner;
