@@ -9,7 +9,6 @@
 #include "platform/System.h"
 #include "src/base/ErrorCode.h"
 #include "src/base/Guarded.h"
-#include "src/entry/Environment.h"
 #include "src/entry/RestartHttpd.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
@@ -56,10 +55,7 @@ WebEntry::WebEntry()
     permissionCache["permResult"] = Json::Value(Json::arrayValue);
 }
 
-// The cookie header goes back first: the next entry of this process is another
-// client's, and must not find this one's session.
 WebEntry::~WebEntry() {
-    (void)Guarded(kSource, __LINE__, [this] { EndEnvironment(permissionCache["environment"]); });
     TaloCgiFree(cgiContext);
     delete cgiContext;
     for (const Json::Value& path : uploadFiles) {
@@ -122,7 +118,7 @@ void WebEntry::AdoptSessionParameter() {
     }
     const char* header = getenv("HTTP_COOKIE");
     const std::string cookie = CookieWithSession(header != nullptr ? header : "", sessionId.Get());
-    SetForRequest(&permissionCache["environment"], "HTTP_COOKIE", cookie);
+    (void)setenv("HTTP_COOKIE", cookie.c_str(), 1);
     (void)TaloCgiLoadInCookies(cgiContext);
     Json::Value document(Json::objectValue);
     document["HTTP_COOKIE"] = cookie;

@@ -6,13 +6,18 @@
 
 namespace TALO {
 
-// Buffers of no file: every use of them fails.
+// The streams are closed again before the method runs: their buffers stay in
+// place, and every use of them fails.
 StandardStreams::StandardStreams(bool disconnectInput, bool disconnectOutput) {
     if (disconnectInput) {
-        input = std::cin.rdbuf(&noInput);
+        noInput.open("/dev/null");
+        input = std::cin.rdbuf(noInput.rdbuf());
+        noInput.close();
     }
     if (disconnectOutput) {
-        output = std::cout.rdbuf(&noOutput);
+        noOutput.open("/dev/null", std::ios::out | std::ios::trunc);
+        output = std::cout.rdbuf(noOutput.rdbuf());
+        noOutput.close();
     }
 }
 

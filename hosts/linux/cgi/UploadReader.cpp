@@ -67,20 +67,9 @@ ssize_t ReadInput(char* buffer, size_t size) {
 
 }  // namespace
 
-std::unique_ptr<UploadReader>& UploadReader::Current() {
-    static std::unique_ptr<UploadReader> reader;
-    return reader;
-}
-
 UploadReader& UploadReader::OfProcess() {
-    if (Current() == nullptr) {
-        Current().reset(new UploadReader);
-    }
-    return *Current();
-}
-
-void UploadReader::Forget() {
-    Current().reset();
+    static UploadReader reader;
+    return reader;
 }
 
 UploadReader::UploadReader() : limits_(ConfiguredMultipartLimits()), form_(limits_) {
