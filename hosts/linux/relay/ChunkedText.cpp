@@ -2,24 +2,13 @@
 
 #include <algorithm>
 
+#include "hosts/linux/util/HexDigit.h"
+
 namespace host {
 
 namespace {
 
 constexpr int kMostDigits = 15;
-
-int HexValue(char byte) {
-    if (byte >= '0' && byte <= '9') {
-        return byte - '0';
-    }
-    if (byte >= 'a' && byte <= 'f') {
-        return byte - 'a' + 10;
-    }
-    if (byte >= 'A' && byte <= 'F') {
-        return byte - 'A' + 10;
-    }
-    return -1;
-}
 
 }  // namespace
 

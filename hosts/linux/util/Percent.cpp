@@ -1,21 +1,10 @@
 #include "hosts/linux/util/Percent.h"
 
+#include "hosts/linux/util/HexDigit.h"
+
 namespace host {
 
 namespace {
-
-int HexValue(char byte) {
-    if (byte >= '0' && byte <= '9') {
-        return byte - '0';
-    }
-    if (byte >= 'a' && byte <= 'f') {
-        return byte - 'a' + 10;
-    }
-    if (byte >= 'A' && byte <= 'F') {
-        return byte - 'A' + 10;
-    }
-    return -1;
-}
 
 bool IsUnreserved(char byte) {
     return (byte >= '0' && byte <= '9') || (byte >= 'a' && byte <= 'z') ||
