@@ -2,6 +2,7 @@
 #define WEBAPI_WEBENTRY_H
 
 #include <json/json.h>
+#include <signal.h>
 
 #include <string>
 
@@ -85,6 +86,14 @@ class WEBAPI_EXPORT WebEntry : public APIRunner {
     /// Write to standard output.
     void OutputHeader();
     void OutputBody();
+
+    /// Lends a mark that is set to 1 right before the first byte of a reply can
+    /// leave: before the header block is written, and before a method runs that may
+    /// write the reply by itself ("allowDownload"). Until then somebody else, such as
+    /// a handler of a crash, can still answer. It counts for every entry of this
+    /// process from now on, not for processes forked from it, and has to last until
+    /// another one, or null for none, takes its place. Clearing it is the lender's.
+    static void WatchAnswer(volatile sig_atomic_t* begun);
 
     /// Runs the callbacks in a child. 0 when there are none, else the child's id,
     /// negative when it could not be started.

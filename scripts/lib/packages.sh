@@ -11,6 +11,8 @@ packages_test=(ccache libgtest-dev libgmock-dev python3 nodejs git curl pkg-conf
     lighttpd lighttpd-mod-openssl openssl nginx fcgiwrap apache2-bin libapache2-mod-xsendfile)
 # shellcheck disable=SC2034
 packages_check=(clang clang-format clang-tidy libclang-rt-14-dev shellcheck)
+# shellcheck disable=SC2034
+packages_bench=(git python3 pkg-config lighttpd nginx fcgiwrap wrk php8.2-fpm libcpp-httplib-dev)
 
 # What a web server needs: packages_of_server lighttpd|nginx|apache
 packages_of_server() {
@@ -44,7 +46,8 @@ install_packages() {
     as_root env DEBIAN_FRONTEND=noninteractive SYSTEMD_OFFLINE=1 RUNLEVEL=1 \
         apt-get -qq -o Dpkg::Use-Pty=0 -o DPkg::Lock::Timeout=300 \
         install -y --no-install-recommends "$@" </dev/null
-    for unit in lighttpd.service nginx.service fcgiwrap.service fcgiwrap.socket; do
+    for unit in lighttpd.service nginx.service fcgiwrap.service fcgiwrap.socket \
+        php8.2-fpm.service; do
         if [[ " $* " == *" ${unit%.*} "* ]] && command -v systemctl >/dev/null; then
             as_root systemctl --quiet disable "$unit" >/dev/null 2>&1 || true
         fi

@@ -1,8 +1,8 @@
 # shellcheck shell=bash
 # shellcheck disable=SC2154  # works on the variables of its caller
 # The parts of scripts/web-server. They work on its variables: root, run_dir,
-# webapi_dir, data_dir, tls_file, service_program, server, port, bind, server_pid,
-# wrapper_pid.
+# webapi_dir, data_dir, tls_file, service_program, warm_program, server, mode, port,
+# bind, server_pid, wrapper_pid, warm_pid.
 # Needs common.sh.
 
 # A UNIX socket's path is short; the web server appends a process id to it.
@@ -17,6 +17,10 @@ check_address() {
     case $server in
         lighttpd | nginx | apache) ;;
         *) usage_error "no web server '$server': lighttpd, nginx or apache" ;;
+    esac
+    case $mode in
+        cgi | warm) ;;
+        *) usage_error "no mode '$mode': cgi or warm" ;;
     esac
     [[ $port =~ ^[1-9][0-9]{0,4}$ && $port -le 65535 ]] || usage_error "'$port' is no port"
     [[ $bind =~ ^[0-9a-zA-Z.:-]+$ ]] || usage_error "'$bind' is no address"
@@ -65,11 +69,14 @@ prepare_run_dir() {
     fi
 }
 
-# nginx and lighttpd work as whoever started them; nginx has to be told so.
-write_configuration() {
-    local text user_line=''
+# fill_in TEMPLATE FILE: nginx and lighttpd work as whoever started them; nginx has to
+# be told so.
+fill_in() {
+    local text user_line='' socket=$socket_dir/fcgi.sock
     [[ $EUID -eq 0 ]] && user_line="user root;"
-    text=$(<"$project/packaging/web-servers/$server.conf.in")
+    [[ $mode == warm ]] && socket=$socket_dir/webapi.sock
+    text=$(<"$project/packaging/web-servers/$1")
+    text=${text//"#$mode# "/}
     [[ -z $data_dir ]] || text=${text//'#send-files# '/}
     if [[ -n $tls_file ]]; then
         text=${text//'#tls# '/}
@@ -80,11 +87,19 @@ write_configuration() {
     text=${text//@DATA_DIR@/"$data_dir"}
     text=${text//@RUN_DIR@/"$run_dir"}
     text=${text//@SOCKET_DIR@/"$socket_dir"}
+    text=${text//@SOCKET@/"$socket"}
     text=${text//@WEBAPI_DIR@/"$webapi_dir"}
     text=${text//@LISTEN@/"$listen"}
     text=${text//@PORT@/"$port"}
     text=${text//@USER_LINE@/"$user_line"}
-    printf '%s\n' "$text" >"$run_dir/$server.conf"
+    printf '%s\n' "$text" >"$run_dir/$2"
+}
+
+# A server's own part, and what it shall do for the web API.
+write_configuration() {
+    fill_in "$server.conf.in" "$server.conf"
+    fill_in "$server-$mode.conf.in" entry.conf
+    [[ $server != nginx ]] || fill_in nginx-streamed.conf streamed.conf
 }
 
 # What the platform calls when a response asks for a restart of the web server.
@@ -110,38 +125,51 @@ launch() {
     echo "$server_pid" >"$run_dir/server.pid"
 }
 
+# await_socket PID SOCKET: the process listens, or the script ends.
+await_socket() {
+    local try
+    for try in {1..100}; do
+        [[ -S $2 ]] && return
+        kill -0 "$1" 2>/dev/null || break
+        sleep 0.05
+    done
+    show_log
+    die "nobody listens on $2 ($try tries)"
+}
+
 # As many processes as requests are served at once; a slow client holds one.
 start_wrapper() {
     (cd "$run_dir" && exec setsid setpriv --pdeathsig TERM \
         fcgiwrap -c 32 -s "unix:$socket_dir/fcgi.sock") >>"$run_dir/wrapper.log" 2>&1 </dev/null &
     wrapper_pid=$!
-    local try
-    for try in {1..100}; do
-        [[ -S $socket_dir/fcgi.sock ]] && return
-        kill -0 "$wrapper_pid" 2>/dev/null || break
-        sleep 0.05
-    done
-    show_log
-    die "fcgiwrap did not start ($try tries)"
+    await_socket "$wrapper_pid" "$socket_dir/fcgi.sock"
+}
+
+# start_warm_server [PRIVILEGES]: options of setpriv. In a session of its own: an
+# interrupt from the terminal reaches the web server first, and this one by the script.
+start_warm_server() {
+    (cd "$run_dir" && exec setsid setpriv --pdeathsig TERM "$@" \
+        "$warm_program" --socket "$socket_dir/webapi.sock") >>"$run_dir/warm.log" 2>&1 </dev/null &
+    warm_pid=$!
+    await_socket "$warm_pid" "$socket_dir/webapi.sock"
 }
 
 # Apache refuses to serve as root. It works as nobody, who may read what root
 # may: a checkout often lies in a folder that is closed to others.
 start_server() {
     local PATH=$PATH:/usr/sbin:/sbin privileges=()
+    if [[ $server == apache && $EUID -eq 0 ]]; then
+        privileges=(--reuid=65534 --regid=65534 --clear-groups
+            --inh-caps=+dac_override --ambient-caps=+dac_override)
+    fi
+    [[ $mode == cgi ]] || start_warm_server "${privileges[@]}"
     case $server in
         lighttpd) launch lighttpd -D -f "$run_dir/lighttpd.conf" ;;
         nginx)
-            start_wrapper
+            [[ $mode == warm ]] || start_wrapper
             launch nginx -p "$run_dir" -c "$run_dir/nginx.conf" -e "$run_dir/error.log"
             ;;
-        apache)
-            if [[ $EUID -eq 0 ]]; then
-                privileges=(--reuid=65534 --regid=65534 --clear-groups
-                    --inh-caps=+dac_override --ambient-caps=+dac_override)
-            fi
-            launch "${privileges[@]}" apache2 -D FOREGROUND -f "$run_dir/apache.conf"
-            ;;
+        apache) launch "${privileges[@]}" apache2 -D FOREGROUND -f "$run_dir/apache.conf" ;;
     esac
 }
 
@@ -208,6 +236,8 @@ stop_all() {
     trap '' INT TERM HUP
     stop_process "$server_pid"
     stop_process "$wrapper_pid" group
+    # It ends its workers; the tasks in its group go on.
+    stop_process "$warm_pid"
     rm -f "$run_dir/server.pid"
     if grep -qsF -- "for the web server of $run_dir." "$service_program"; then
         rm -f "$service_program"

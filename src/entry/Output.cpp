@@ -1,6 +1,7 @@
 #include <cstdio>
 #include <string>
 
+#include "src/base/AnswerMark.h"
 #include "src/base/JsonText.h"
 #include "webapi/APIResponse.h"
 #include "webapi/WebEntry.h"
@@ -39,12 +40,17 @@ void WebEntry::OutputHeader() {
     }
     block += kNoCache;
     block += kLineEnd;
+    MarkAnswerBegun();
     Write(block);
 }
 
 void WebEntry::OutputBody() {
     Write(toString(response->GetBody()));
     (void)std::fflush(stdout);
+}
+
+void WebEntry::WatchAnswer(volatile sig_atomic_t* begun) {
+    LendAnswerMark(begun);
 }
 
 }  // namespace TALO

@@ -9,6 +9,7 @@
 #include "platform/System.h"
 #include "src/base/ErrorCode.h"
 #include "src/base/Guarded.h"
+#include "src/entry/Environment.h"
 #include "src/entry/RestartHttpd.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
@@ -55,7 +56,10 @@ WebEntry::WebEntry()
     permissionCache["permResult"] = Json::Value(Json::arrayValue);
 }
 
+// The cookie header goes back first: the next entry of this process is another
+// client's, and must not find this one's session.
 WebEntry::~WebEntry() {
+    (void)Guarded(kSource, __LINE__, [this] { EndEnvironment(permissionCache["environment"]); });
     TaloCgiFree(cgiContext);
     delete cgiContext;
     for (const Json::Value& path : uploadFiles) {
@@ -118,7 +122,7 @@ void WebEntry::AdoptSessionParameter() {
     }
     const char* header = getenv("HTTP_COOKIE");
     const std::string cookie = CookieWithSession(header != nullptr ? header : "", sessionId.Get());
-    (void)setenv("HTTP_COOKIE", cookie.c_str(), 1);
+    SetForRequest(&permissionCache["environment"], "HTTP_COOKIE", cookie);
     (void)TaloCgiLoadInCookies(cgiContext);
     Json::Value document(Json::objectValue);
     document["HTTP_COOKIE"] = cookie;

@@ -5,11 +5,11 @@
 #include <cstring>
 
 #include "platform/Paths.h"
-#include "platform/WebAPIUtil.h"
 #include "src/base/ErrorCode.h"
 #include "src/base/Guarded.h"
 #include "src/base/JsonConvert.h"
 #include "src/runner/APIRunnerPrivate.h"
+#include "src/runner/DescriptionCache.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
 
@@ -24,7 +24,7 @@ APIRunner::APIRunner()
       d(new APIRunnerPrivate(this)) {
     (void)setsid();
     Json::Value defaults;
-    if (WebAPIUtil::ReadJsonFile(defaults, TALO_LIB_DEF) && defaults.isObject()) {
+    if (ReadDescriptionFile(defaults, TALO_LIB_DEF, Keep::kAtOnce) && defaults.isObject()) {
         libDef.swap(defaults);
     }
 }

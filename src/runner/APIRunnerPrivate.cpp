@@ -1,10 +1,11 @@
 #include "src/runner/APIRunnerPrivate.h"
 
 #include <errno.h>
+#include <fcntl.h>
 #include <string.h>
+#include <unistd.h>
 
 #include <cstdio>
-#include <fstream>
 
 namespace TALO {
 
@@ -13,18 +14,44 @@ namespace {
 // The base name of the program as it was started, before anybody renamed it.
 // Reading ends at a blank: arguments that were joined into one are left out.
 std::string StartName() {
-    std::ifstream commandLine("/proc/self/cmdline");
-    if (!commandLine) {
+    const int commandLine = open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
+    if (commandLine < 0) {
         return program_invocation_short_name;
     }
+    constexpr char kEnds[] = {' ', '\0'};
     std::string text;
-    std::getline(commandLine, text, ' ');
-    return basename(text.c_str());
+    char block[256];
+    size_t end = std::string::npos;
+    for (ssize_t got = 0;
+         end == std::string::npos && (got = read(commandLine, block, sizeof block)) > 0;) {
+        text.append(block, static_cast<size_t>(got));
+        end = text.find_first_of(kEnds, 0, sizeof kEnds);
+    }
+    (void)close(commandLine);
+    return basename(text.substr(0, end).c_str());
+}
+
+// What the last runner left in the argument vector: the start name, cut by one
+// character where it had no more room. A process with many requests, one runner
+// each, would else forget a piece of its name, and of its room, with each.
+struct Left {
+    char* argument;
+    unsigned room;
+    char shown[256];
+    char startName[256];
+};
+Left left = {};
+
+bool ShowsWhatWasLeft(const char* text) {
+    return left.shown[0] != '\0' && strcmp(text, left.shown) == 0;
 }
 
 }  // namespace
 
 APIRunnerPrivate::APIRunnerPrivate(APIRunner* runner) : runner(runner), origProcName(StartName()) {
+    if (ShowsWhatWasLeft(origProcName.c_str())) {
+        origProcName = left.startName;
+    }
     procName = origProcName;
 }
 
@@ -36,7 +63,9 @@ void APIRunnerPrivate::SetArgs(int argc, char** argv) {
         procName = "entry.cgi";
     }
     argv0 = argv[0];
-    argv0Len = static_cast<unsigned>(strlen(argv0));
+    argv0Len = argv0 == left.argument && ShowsWhatWasLeft(argv0)
+                   ? left.room
+                   : static_cast<unsigned>(strlen(argv0));
     memset(argv0, 0, argv0Len);
 }
 
@@ -46,6 +75,17 @@ void APIRunnerPrivate::SetArgv0(const std::string& name) {
     }
     memset(argv0, 0, argv0Len);
     (void)snprintf(argv0, argv0Len, "%s", name.c_str());
+}
+
+void APIRunnerPrivate::LeaveArgv0() {
+    if (argv0 == nullptr || argv0Len > sizeof left.shown ||
+        origProcName.size() >= sizeof left.startName) {
+        return;
+    }
+    left.argument = argv0;
+    left.room = argv0Len;
+    (void)snprintf(left.shown, sizeof left.shown, "%s", argv0);
+    (void)snprintf(left.startName, sizeof left.startName, "%s", origProcName.c_str());
 }
 
 }  // namespace TALO

@@ -21,6 +21,9 @@ class APIRunnerPrivate {
     // was long. Nothing before SetArgs.
     void SetArgv0(const std::string& name);
 
+    // Remembers what the argument vector shows and why, for the next runner.
+    void LeaveArgv0();
+
     std::string& GetProcName() {
         return procName;
     }

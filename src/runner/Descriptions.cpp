@@ -2,10 +2,10 @@
 #include <glob.h>
 
 #include "platform/System.h"
-#include "platform/WebAPIUtil.h"
 #include "src/base/JsonConvert.h"
 #include "src/base/Log.h"
 #include "src/runner/APIRunnerPrivate.h"
+#include "src/runner/DescriptionCache.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIRunner.h"
 
@@ -45,13 +45,15 @@ std::string FindDescriptionFile(const std::string& api) {
     return chosen;
 }
 
+// The file's content is the caller's own and goes: a copy of each description would
+// be the largest part of what a request costs in a process that keeps the files.
 void AddDescriptions(APIRunner& runner, Json::Value& file, Json::Value& descs) {
     if (!file.isObject()) {
         return;
     }
     for (auto member = file.begin(); member != file.end(); ++member) {
         if (runner.CheckLibDescription(*member)) {
-            descs[member.name()] = runner.ApplyLibDef(*member);
+            descs[member.name()].swap(runner.ApplyLibDef(*member));
         } else {
             LOG_ERROR("WebAPI description %s is not valid.", member.name().c_str());
         }
@@ -77,7 +79,7 @@ int APIRunner::InitLibDesc(Json::Value& descs, const std::string& api) {
     }
     Json::Value content;
     errno = 0;
-    if (!WebAPIUtil::ReadJsonFile(content, file.c_str())) {
+    if (!ReadDescriptionFile(content, file.c_str(), Keep::kWhenReadAgain)) {
         LOG_ERROR("WebAPI description file %s is not valid", file.c_str());
         return 0;
     }
@@ -89,6 +91,7 @@ int APIRunner::InitLibDesc(Json::Value& descs, APIRequest* request) {
     return request != nullptr ? InitLibDesc(descs, request->GetAPIClass()) : 0;
 }
 
+// Who asks for all of them will ask again, or is about to fork those who will.
 int APIRunner::InitLibDesc(Json::Value& descs) {
     glob_t files = {};
     if (glob("*.lib", 0, nullptr, &files) != 0) {
@@ -97,7 +100,7 @@ int APIRunner::InitLibDesc(Json::Value& descs) {
     }
     for (size_t index = 0; index < files.gl_pathc; ++index) {
         Json::Value content;
-        if (WebAPIUtil::ReadJsonFile(content, files.gl_pathv[index])) {
+        if (ReadDescriptionFile(content, files.gl_pathv[index], Keep::kAtOnce)) {
             AddDescriptions(*this, content, descs);
         }
     }

@@ -1,3 +1,4 @@
+#include "src/base/AnswerMark.h"
 #include "src/base/ErrorCode.h"
 #include "src/base/Guarded.h"
 #include "src/base/JsonConvert.h"
@@ -163,6 +164,9 @@ int APIRunner::ProcessLib(APIRequest* request, APIResponse* response) {
     _tag_API_CHECK_TABLE* checkTable = nullptr;
     if (!OpenLib(request, &table, &checkTable) || table == nullptr) {
         return Fail(response, kErrorLibrary);
+    }
+    if (allowDownload) {
+        MarkAnswerBegun();
     }
     const StandardStreams streams(!allowUpload, !allowDownload);
     const SchedulingPriority priority(ToInt(request->GetAPIInfo("priority", 0), 0));

@@ -6,18 +6,13 @@
 
 namespace TALO {
 
-// The streams are closed again before the method runs: their buffers stay in
-// place, and every use of them fails.
+// Buffers of no file: every use of them fails.
 StandardStreams::StandardStreams(bool disconnectInput, bool disconnectOutput) {
     if (disconnectInput) {
-        noInput.open("/dev/null");
-        input = std::cin.rdbuf(noInput.rdbuf());
-        noInput.close();
+        input = std::cin.rdbuf(&noInput);
     }
     if (disconnectOutput) {
-        noOutput.open("/dev/null", std::ios::out | std::ios::trunc);
-        output = std::cout.rdbuf(noOutput.rdbuf());
-        noOutput.close();
+        output = std::cout.rdbuf(&noOutput);
     }
 }
 

@@ -17,8 +17,8 @@ class StandardStreams {
     StandardStreams& operator=(const StandardStreams&) = delete;
 
   private:
-    std::ifstream noInput;
-    std::ofstream noOutput;
+    std::filebuf noInput;
+    std::filebuf noOutput;
     std::streambuf* input = nullptr;
     std::streambuf* output = nullptr;
 };

@@ -66,6 +66,7 @@ void APIRunner::SetArgs(int argc, char** argv) {
 void RestoreProcessName(APIRunnerPrivate* d) {
     const std::string& name = d->GetOrigProcName();
     d->SetArgv0(name);
+    d->LeaveArgv0();
     (void)snprintf(logIdentity, sizeof logIdentity, "%s", name.c_str());
     IdentifyToLog();
     (void)snprintf(taskName, sizeof taskName, "%s", name.c_str());

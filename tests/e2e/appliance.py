@@ -99,7 +99,7 @@ class Appliance:
     `number` is what the other appliances of a test know it by.
     """
 
-    def __init__(self, number, server, root, run_dir):
+    def __init__(self, number, server, root, run_dir, mode="cgi"):
         self.number = number
         self.root = pathlib.Path(root).resolve()
         self._folder = folder = pathlib.Path(f"{run_dir}-state")
@@ -111,7 +111,7 @@ class Appliance:
         self.log = SystemLog()
         self.server = WebServer(
             server, root, run_dir, options=["--tls", folder / "tls.pem"],
-            through=[*self.log.command(), *self.on_state()])
+            through=[*self.log.command(), *self.on_state()], mode=mode)
         self.url = f"https://{HOST}:{self.server.port}{ENTRY}"
         self.volume = self.state / "volume1"
         self.configure()

@@ -44,4 +44,4 @@ class Case(unittest.TestCase):
 
     def is_sanitized(self):
         """A sanitizer's own memory says nothing about the program's."""
-        return b"__asan_init" in (self.server.webapi_dir / "entry.cgi").read_bytes()
+        return b"__asan_init" in self.server.entry.read_bytes()

@@ -32,7 +32,8 @@ def start_appliances():
     server = Case.server
     started = []
     for number, name in enumerate(("first", "second", "third"), start=1):
-        appliance = Appliance(number, server.name, server.root, f"{server.run_dir}-{name}")
+        appliance = Appliance(number, server.name, server.root, f"{server.run_dir}-{name}",
+                              server.mode)
         started.append(appliance)
         unittest.addModuleCleanup(stop, appliance)
         appliance.add_account("ann", "--admin")

@@ -1,6 +1,7 @@
 """All end-to-end cases against one web server: run.py --help."""
 
 import argparse
+import json
 import os
 import pathlib
 import shutil
@@ -18,8 +19,8 @@ MOUNTED = "WEBAPI_E2E_MOUNTED"
 SMALL_VOLUME_MEBIBYTES = 48
 
 
-def install_test_apis(root, modules):
-    """Puts the test APIs beside the shipped ones."""
+def install_test_apis(root, modules, life):
+    """Puts the test APIs beside the shipped ones, and lets all workers live that long."""
     webapi_dir = pathlib.Path(root) / "usr/talo/taloman/webapi"
     libraries = list(pathlib.Path(modules).glob("*.so"))
     if not libraries:
@@ -28,6 +29,15 @@ def install_test_apis(root, modules):
         shutil.copy(path, webapi_dir / "lib")
     for path in [*HERE.parent.glob("modules/*.lib"), *HERE.glob("*.lib")]:
         shutil.copy(path, webapi_dir)
+    for path in webapi_dir.glob("*.lib") if life else ():
+        set_isolation(path, life)
+
+
+def set_isolation(path, life):
+    apis = json.loads(path.read_text(encoding="utf-8"))
+    for description in apis.values():
+        description["isolation"] = life
+    path.write_text(json.dumps(apis), encoding="utf-8")
 
 
 def in_own_mounts(root, build, small_volume):
@@ -74,6 +84,9 @@ def complaints_after(server, status):
 def main():
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("--server", required=True, choices=("lighttpd", "nginx", "apache"))
+    parser.add_argument("--mode", default="cgi", choices=("cgi", "warm"))
+    parser.add_argument("--life", choices=("request", "worker"),
+                        help="of a warm worker, whatever the descriptions say")
     parser.add_argument("--root", required=True, help="the root that the build was made for")
     parser.add_argument("--build", required=True, help="the build's folder, to install from")
     parser.add_argument("--run-dir", required=True, help="the web server's own folder")
@@ -86,8 +99,9 @@ def main():
     in_own_mounts(arguments.root, arguments.build, small_volume)
     Case.small_volume = pathlib.Path(small_volume)
 
-    install_test_apis(arguments.root, arguments.modules)
-    server = Case.server = WebServer(arguments.server, arguments.root, run_dir)
+    install_test_apis(arguments.root, arguments.modules, arguments.life)
+    server = Case.server = WebServer(arguments.server, arguments.root, run_dir,
+                                     mode=arguments.mode)
     try:
         files = "slow_*.py" if arguments.slow else "test_*.py"
         passed = run_cases(files, arguments.pattern)

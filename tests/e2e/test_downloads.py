@@ -13,7 +13,7 @@ from case import Case
 from client import ENTRY, Client
 from multipart import Content, digest
 from volumes import entries, file_call
-from webserver import HOST, WebServer, processes_that_mention, wait_until
+from webserver import HOST, processes_that_mention, wait_until
 
 MEBIBYTE = 1 << 20
 PEAK_KIBIBYTES = 16 * 1024
@@ -191,8 +191,7 @@ class SentByTheServer(DownloadCase):
         cls.addClassCleanup(folder.cleanup)
         cls.data = pathlib.Path(folder.name) / "data"
         cls.data.mkdir()
-        cls.second = WebServer(cls.server.name, cls.server.root, f"{cls.server.run_dir}-sends",
-                               ["--send-files", cls.data])
+        cls.second = cls.server.other("sends", ["--send-files", cls.data])
         cls.addClassCleanup(cls.stop)
 
     @classmethod

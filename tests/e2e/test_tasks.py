@@ -169,6 +169,6 @@ class WebServerGoes(TaskCase):
             time.sleep(0.5)
             self.assertTrue(lives(pid))
         finally:
-            self.server.__init__(self.server.name, self.server.root, self.server.run_dir)
+            self.server.start()
             self.client = Client(HOST, self.server.port)
         self.assertEqual(self.finishes(sid, task_id)["data"], {"state": "done", "pid": pid})

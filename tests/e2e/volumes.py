@@ -16,15 +16,18 @@ def file_call(method, **parameters):
 
 
 def entries(server, like="self"):
-    """The ids of the entry processes of a server's root, as the process `like` sees it.
-    Others may run, of other roots that are mounted at the same place."""
-    program = str(server.webapi_dir / "entry.cgi")
+    """The ids of the processes of a server's root that serve a request, as the process
+    `like` sees it. Others may run, of other roots that are mounted at the same place."""
+    program = str(server.warm_program if server.mode == "warm" else server.entry)
     mounts = os.readlink(f"/proc/{like}/ns/mnt")
     found = []
     for process in pathlib.Path("/proc").glob("[0-9]*"):
         try:
             if (os.readlink(process / "exe") == program and
-                    os.readlink(process / "ns/mnt") == mounts):
+                    os.readlink(process / "ns/mnt") == mounts and
+                    # A worker that waits has no connection there.
+                    (server.mode == "cgi" or
+                     os.readlink(process / "fd/0").startswith("socket:"))):
                 found.append(int(process.name))
         except OSError:
             pass

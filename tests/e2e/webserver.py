@@ -87,14 +87,20 @@ class Foreground:
 class WebServer:
     """Serves a root on a free loopback port. The words of `through` start the script."""
 
-    def __init__(self, name, root, run_dir, options=(), through=()):
+    def __init__(self, name, root, run_dir, options=(), through=(), mode="cgi"):
         self.name = name
+        self.mode = mode
         self.through = list(through)
         self.options = [str(option) for option in options]
         self.root = pathlib.Path(root).resolve()
         self.run_dir = pathlib.Path(run_dir)
         self.webapi_dir = self.root / "usr/talo/taloman/webapi"
+        self.entry = self.webapi_dir / "entry.cgi"
+        self.warm_program = self.root / "usr/sbin/webapi-server"
         self.service_program = self.root / "usr/talo/sbin/talo-service"
+        self.start()
+
+    def start(self):
         for _ in range(3):
             self.port = free_port()
             self.script = Foreground(self.command())
@@ -105,8 +111,13 @@ class WebServer:
 
     def command(self):
         return [*self.through, str(PROJECT / "scripts/web-server"), "--server", self.name,
-                "--port", str(self.port), "--root", str(self.root), "--run-dir",
-                str(self.run_dir), *self.options]
+                "--mode", self.mode, "--port", str(self.port), "--root", str(self.root),
+                "--run-dir", str(self.run_dir), *self.options]
+
+    def other(self, suffix, options=(), mode=None):
+        """Another one of the same kind, or of the other mode, for the same root."""
+        return WebServer(self.name, self.root, f"{self.run_dir}-{suffix}", options,
+                         mode=mode or self.mode)
 
     def restarts(self):
         """How often the server has finished a start or a restart, by its own log."""

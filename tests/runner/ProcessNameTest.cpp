@@ -232,6 +232,42 @@ TEST_F(ProcessName, GoesBackToTheStartNameInTheEnd) {
     });
 }
 
+// A process with many requests: cut names must not be cut again.
+TEST_F(ProcessName, IsTheSameForEveryRequestOfAProcess) {
+    runner::InChild([] {
+        ProgramName program("/lib/prog");
+        for (int round = 0; round < 12; ++round) {
+            runner::OpenRunner runner;
+            if (round == 0) {
+                runner.d->GetOrigProcName() = "a-longer-name";
+            }
+            runner.SetArgs(1, program.Vector());
+            EXPECT_TRUE(program.IsBlank());
+            EXPECT_EQ(runner.d->argv0Len, 9u);
+            TALO::APIRequest named(Post("A.B", 1, "list"));
+            TALO::APIResponse answer(&named);
+            ASSERT_EQ(runner.SetProcessName(&named, &answer), 1);
+            EXPECT_EQ(program.Shown().size(), 8u);
+            runner.d->GetOrigProcName() = "a-longer-name";
+        }
+        EXPECT_EQ(program.Shown(), "a-longer");
+    });
+}
+
+TEST_F(ProcessName, AtTheStartIsRememberedByTheNextRunner) {
+    runner::InChild([] {
+        std::string first;
+        for (int round = 0; round < 4; ++round) {
+            runner::OpenRunner runner;
+            first = round == 0 ? runner.d->GetOrigProcName() : first;
+            EXPECT_EQ(runner.d->GetOrigProcName(), first);
+            EXPECT_EQ(runner.d->GetProcName(), first);
+            runner.SetArgs(probe::ArgumentCount(), probe::Arguments());
+            runner.d->SetArgv0("unrelated");
+        }
+    });
+}
+
 TEST_F(ProcessName, IsSeenByTheMethod) {
     Install("Test.Basic");
     runner::InChild([this] {

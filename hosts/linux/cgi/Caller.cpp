@@ -28,6 +28,10 @@ void ForgetCaller(const TALOCGI* context) {
     }
 }
 
+void ForgetCaller() {
+    Last() = Accepted();
+}
+
 bool FindCaller(Caller* caller) {
     if (Last().context == nullptr) {
         return false;

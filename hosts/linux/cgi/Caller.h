@@ -19,6 +19,10 @@ struct Caller {
 void SetCaller(const TALOCGI* context, const talo::Session& session);
 void ForgetCaller(const TALOCGI* context);
 
+// Forgets it whoever's it is: a context that an API library made and did not free
+// must not speak for the next request.
+void ForgetCaller();
+
 // False, and `caller` untouched, when there is none.
 bool FindCaller(Caller* caller);
 

@@ -17,12 +17,6 @@ using host::UploadReader;
 
 using Entries = std::vector<UploadForm::Field>;
 
-// The names that the files of this process's body have.
-UploadNames& Names() {
-    static UploadNames names;
-    return names;
-}
-
 // A folder's name without the final slash that the file's would get.
 std::string FolderOf(const char* dir) {
     std::string folder = dir;
@@ -71,12 +65,12 @@ int LoadAll(UploadReader& reader, TALOSZHASH** params, TALOSZHASH** files, const
     Entries paths;
     Entries facts;
     for (const auto& file : stored) {
-        const std::string name = Names().Take(file.name);
+        const std::string name = reader.Names().Take(file.name);
         paths.emplace_back(name, file.file->Path());
         AddFacts(name, file, &facts);
     }
     auto fields = form.TakeFields();
-    Names().DropTaken(&fields);
+    reader.Names().DropTaken(&fields);
     if (!Fits(*params, fields.size() + facts.size()) || !Fits(*files, paths.size())) {
         return reader.Fail(TALO_UPLOAD_LIMIT, "too many fields and files");
     }
@@ -149,7 +143,7 @@ int LoadParams(UploadReader& reader, TALOCGI* ctx, TALOCGIPROGRESS progress, TAL
         return reader.Result();
     }
     auto fields = reader.Form().TakeFields();
-    Names().DropTaken(&fields);
+    reader.Names().DropTaken(&fields);
     if (!Fits(ctx->paramHash, fields.size())) {
         return reader.Fail(TALO_UPLOAD_LIMIT, "too many fields");
     }
@@ -181,9 +175,9 @@ int LoadFile(UploadReader& reader, TALOCGI* ctx, const char* dir, TALOCGIPROGRES
         return reader.Result();
     }
     const auto stored = form.TakeStored();
-    Names().TakeAnyway(name);
+    reader.Names().TakeAnyway(name);
     auto entries = form.TakeFields();
-    Names().DropTaken(&entries);
+    reader.Names().DropTaken(&entries);
     for (const auto& file : stored) {
         entries.emplace_back(name, file.file->Path());
         AddFacts(name, file, &entries);

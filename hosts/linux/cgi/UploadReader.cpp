@@ -67,9 +67,20 @@ ssize_t ReadInput(char* buffer, size_t size) {
 
 }  // namespace
 
-UploadReader& UploadReader::OfProcess() {
-    static UploadReader reader;
+std::unique_ptr<UploadReader>& UploadReader::Current() {
+    static std::unique_ptr<UploadReader> reader;
     return reader;
+}
+
+UploadReader& UploadReader::OfProcess() {
+    if (Current() == nullptr) {
+        Current().reset(new UploadReader);
+    }
+    return *Current();
+}
+
+void UploadReader::Forget() {
+    Current().reset();
 }
 
 UploadReader::UploadReader() : limits_(ConfiguredMultipartLimits()), form_(limits_) {

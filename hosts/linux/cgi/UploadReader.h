@@ -7,6 +7,7 @@
 
 #include "hosts/linux/cgi/MultipartParser.h"
 #include "hosts/linux/cgi/UploadForm.h"
+#include "hosts/linux/cgi/UploadNames.h"
 #include "platform/Cgi.h"
 
 namespace host {
@@ -17,6 +18,10 @@ class UploadReader {
   public:
     // Made at the first call, from the environment as it is then.
     static UploadReader& OfProcess();
+
+    // The request is over: files that were not taken are gone, and the next call
+    // makes another reader.
+    static void Forget();
 
     // Reads up to where the form pauses, or to the end. TALO_UPLOAD_OK or, then and
     // ever after, why it failed; the files that were not taken are gone then.
@@ -32,6 +37,10 @@ class UploadReader {
     UploadForm& Form() {
         return form_;
     }
+    // Those that the body's files have.
+    UploadNames& Names() {
+        return names_;
+    }
     unsigned long long Total() const {
         return total_;
     }
@@ -45,6 +54,7 @@ class UploadReader {
 
   private:
     UploadReader();
+    static std::unique_ptr<UploadReader>& Current();
     bool Begin(std::string* reason);
     int ReadBlocks(TALOCGIPROGRESS progress);
     bool Fill();
@@ -53,6 +63,7 @@ class UploadReader {
 
     const MultipartLimits limits_;
     UploadForm form_;
+    UploadNames names_;
     std::unique_ptr<MultipartParser> parser_;
     std::unique_ptr<char[]> block_;
     size_t at_ = 0;

@@ -1,0 +1,41 @@
+#include "programs/common/DiscardInput.h"
+
+#include <limits.h>
+#include <poll.h>
+#include <string.h>
+#include <time.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+
+namespace {
+
+long MillisecondsNow() {
+    struct timespec now = {};
+    (void)clock_gettime(CLOCK_MONOTONIC, &now);
+    return now.tv_sec * 1000 + now.tv_nsec / 1000000;
+}
+
+}  // namespace
+
+void DiscardInput() {
+    const char* const type = getenv("CONTENT_TYPE");
+    const bool isUpload = type != nullptr && strstr(type, "multipart/form-data") != nullptr;
+    const long mostBytes = isUpload ? LONG_MAX : 64L << 20;
+    const long mostMilliseconds = isUpload ? 10000 : 1000;
+    constexpr long kPause = 1000;  // of an upload's client
+    static char discarded[64 * 1024];
+    struct pollfd input = {STDIN_FILENO, POLLIN, 0};
+    const long end = MillisecondsNow() + mostMilliseconds;
+    long total = 0;
+    for (long left = isUpload ? kPause : 0;
+         total < mostBytes && left >= 0 && poll(&input, 1, static_cast<int>(left)) > 0;
+         left = std::min(kPause, end - MillisecondsNow())) {
+        const ssize_t count = read(STDIN_FILENO, discarded, sizeof discarded);
+        if (count <= 0) {
+            return;
+        }
+        total += count;
+    }
+}

@@ -1,0 +1,11 @@
+#ifndef TALO_PROGRAMS_COMMON_DISCARDINPUT_H
+#define TALO_PROGRAMS_COMMON_DISCARDINPUT_H
+
+// Takes what is left of a body that nobody asked for off standard input: some
+// servers lose the reply of a program that ends before it has read its input.
+// Never waits for a client that sends nothing, and for one that dawdles no longer
+// than a moment. An upload that was refused has a client that is still sending
+// for certain: it gets longer, however much it sends.
+void DiscardInput();
+
+#endif

@@ -1,0 +1,53 @@
+#ifndef TALO_PROGRAMS_WEBAPI_SERVER_MASTER_H
+#define TALO_PROGRAMS_WEBAPI_SERVER_MASTER_H
+
+#include "programs/webapi_server/Listen.h"
+#include "programs/webapi_server/Workers.h"
+
+// The process that supervises: accepts every connection, hands it to a worker or
+// lets it wait, and answers in place of a worker that cannot. It reads no request and
+// loads no API library. One thread, which waits for nobody in particular.
+class Master {
+  public:
+    Master(Listener& listener, const Settings& settings, const OriginalProcess& original);
+    ~Master();
+    Master(const Master&) = delete;
+    Master& operator=(const Master&) = delete;
+
+    // Until SIGTERM or SIGINT, and the requests that were there by then are served.
+    // False when it could not begin.
+    bool Run();
+
+  private:
+    bool Begin();
+    void Handle(const Event& event);
+    void Accept();
+    bool AcceptOne();
+    void Refuse(int connection);
+    void HandOut();
+    void ReadSignals();
+    void ReapChildren();
+    void StartDraining();
+    bool IsDrained();
+    void Tick();
+    int MillisecondsToWait() const;
+
+    Listener& listener_;
+    Poller poller_;
+    SlotTable slots_;
+    ConnectionQueue queue_;
+    Farewell farewell_;
+    Workers workers_;
+    Templates templates_;
+    int signals_ = -1;
+    long long now_;
+    long long nextTick_ = 0;
+    bool isAccepting_ = false;
+    bool hasClients_ = false;  // to accept
+    long long acceptNotBefore_ = 0;
+    long long drainUntil_ = 0;  // 0: goes on
+    long long nextRefusalLog_ = 0;
+    int refusals_ = 0;
+};
+
+#endif

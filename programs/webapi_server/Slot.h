@@ -1,0 +1,25 @@
+#ifndef TALO_PROGRAMS_WEBAPI_SERVER_SLOT_H
+#define TALO_PROGRAMS_WEBAPI_SERVER_SLOT_H
+
+#include <signal.h>
+#include <sys/types.h>
+
+#include <atomic>
+
+// What a worker shows to the master, in memory that both map. The worker writes,
+// the master reads, except that the master clears a slot before it gives it away.
+struct Slot {
+    std::atomic<pid_t> pid;
+    std::atomic<long long> began;       // of the request, CLOCK_MONOTONIC ms; 0 when idle
+    std::atomic<long long> allowedMs;   // until it is ended; 0 without limit
+    std::atomic<int> transfers;         // 1: an upload or a download; progress extends the limit
+    volatile sig_atomic_t answerBegun;  // the first byte of the reply is about to leave
+    char api[128];                      // zero-terminated, for the log
+};
+
+// The control socket (SOCK_SEQPACKET) between the two. The master sends kServe with
+// the connection as its ancillary descriptor, or kLeave; the worker sends kIdle when
+// it is ready for another request. A worker that ends just closes its side.
+enum ControlMessage : char { kServe = 's', kLeave = 'l', kIdle = 'i' };
+
+#endif

@@ -1,0 +1,188 @@
+#include "programs/webapi_server/Templates.h"
+
+#include <signal.h>
+#include <sys/socket.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+namespace {
+
+constexpr long long kMostPreparing = 60000;
+constexpr long long kSoundLife = 10000;
+constexpr long long kFirstPause = 100;
+constexpr int kMostDoublings = 7;
+
+}  // namespace
+
+Templates::Templates(const Poller& poller, SlotTable& slots, const Settings& settings,
+                     const OriginalProcess& original, TemplateEvents& events)
+    : poller_(poller), slots_(slots), settings_(settings), original_(original), events_(events) {}
+
+Templates::~Templates() {
+    for (Handle& handle : all_) {
+        Drop(handle);
+    }
+}
+
+void Templates::Reload(const char* reason, long long now) {
+    if (!isWanted_) {
+        syslog(LOG_NOTICE, "loads descriptions and libraries: %s", reason);
+    }
+    isWanted_ = true;
+    Tick(now);
+}
+
+int Templates::Generation() const {
+    for (const Handle& handle : all_) {
+        if (handle.state == State::kCurrent) {
+            return handle.generation;
+        }
+    }
+    return 0;
+}
+
+bool Templates::Order(const StartOrder& order, int workerControl) {
+    Handle* const current = Find(State::kCurrent);
+    if (current == nullptr ||
+        !SendMessage(current->control, &order, sizeof order, workerControl, MSG_DONTWAIT)) {
+        return false;
+    }
+    ++current->pending;
+    return true;
+}
+
+void Templates::Tick(long long now) {
+    Handle* const preparing = Find(State::kPreparing);
+    if (preparing == nullptr) {
+        if (isWanted_ && now >= notBefore_) {
+            Launch(now);
+        }
+    } else if (now - preparing->since > kMostPreparing) {
+        syslog(LOG_ERR, "loading takes too long");
+        (void)kill(preparing->pid, SIGKILL);
+        End(*preparing, now);
+    }
+}
+
+void Templates::OnMessage(const Event& event, long long now) {
+    Handle& handle = all_[static_cast<size_t>(event.index) % all_.size()];
+    if (handle.state == State::kNone || handle.serial != event.serial) {
+        return;
+    }
+    TemplateReport report = {};
+    int descriptor = -1;
+    const ssize_t got =
+        ReceiveMessage(handle.control, &report, sizeof report, &descriptor, MSG_DONTWAIT);
+    if (got == sizeof report) {
+        OnReport(handle, report, descriptor, now);
+    } else if (got >= 0) {
+        End(handle, now);
+    }
+}
+
+void Templates::OnReport(Handle& handle, const TemplateReport& report, int descriptor,
+                         long long now) {
+    switch (report.kind) {
+        case Report::kReady:
+            BecomeCurrent(handle, now);
+            return;
+        case Report::kChanged:
+            if (handle.state == State::kCurrent && Find(State::kPreparing) == nullptr) {
+                Reload("something has changed", now);
+            }
+            return;
+        case Report::kEnded:
+            events_.OnEnded(report);
+            return;
+        case Report::kStarted:
+            events_.OnStarted(report, descriptor);
+            break;
+        case Report::kFailed:
+            events_.OnFailed(report);
+            break;
+    }
+    --handle.pending;
+    if (handle.state == State::kRetiring) {
+        Retire(handle);
+    }
+}
+
+void Templates::Launch(long long now) {
+    Handle* const handle = Find(State::kNone);
+    int ends[2] = {-1, -1};
+    if (handle == nullptr || socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends) != 0) {
+        notBefore_ = now + kFirstPause;
+        return;
+    }
+    const bool loadsLibraries = !libraryFailed_;
+    const pid_t pid = fork();
+    if (pid == 0) {
+        RunTemplate({ends[1], &slots_, &settings_, &original_, loadsLibraries});
+    }
+    (void)close(ends[1]);
+    *handle = {State::kPreparing, pid, ends[0], ++generation_, 0, now, ++serial_, loadsLibraries};
+    if (pid < 0 || !poller_.Add(ends[0], {Source::kTemplate, static_cast<int>(handle - all_.data()),
+                                          serial_})) {
+        syslog(LOG_ERR, "cannot make a template: %m");
+        End(*handle, now);
+        return;
+    }
+    isWanted_ = false;
+}
+
+void Templates::BecomeCurrent(Handle& handle, long long now) {
+    if (!handle.loadsLibraries) {
+        syslog(LOG_WARNING, "libraries are loaded when they are called: loading one ahead failed");
+    }
+    libraryFailed_ = false;
+    Handle* const before = Find(State::kCurrent);
+    handle.state = State::kCurrent;
+    handle.since = now;
+    if (before != nullptr) {
+        before->state = State::kRetiring;
+        Retire(*before);
+    }
+    events_.OnReady(handle.generation);
+}
+
+// Its workers are left to it until it has started all that were ordered; from then
+// on they are the master's own children.
+void Templates::Retire(Handle& handle) {
+    if (handle.pending <= 0) {
+        Drop(handle);
+    }
+}
+
+void Templates::End(Handle& handle, long long now) {
+    const bool wasPreparing = handle.state == State::kPreparing;
+    const bool wasCurrent = handle.state == State::kCurrent;
+    const int generation = handle.generation;
+    if (wasPreparing || wasCurrent) {
+        syslog(LOG_ERR, "the template has ended%s", wasPreparing ? " while loading" : "");
+        failures_ = wasCurrent && now - handle.since > kSoundLife ? 0 : failures_ + 1;
+        libraryFailed_ = libraryFailed_ || wasPreparing;
+        notBefore_ = now + (kFirstPause << std::min(failures_, kMostDoublings));
+        isWanted_ = true;
+    }
+    Drop(handle);
+    events_.OnLost(generation);
+}
+
+void Templates::Drop(Handle& handle) {
+    if (handle.control >= 0) {
+        poller_.Remove(handle.control);
+        (void)close(handle.control);
+    }
+    handle = Handle();
+}
+
+Templates::Handle* Templates::Find(State state) {
+    for (Handle& handle : all_) {
+        if (handle.state == state) {
+            return &handle;
+        }
+    }
+    return nullptr;
+}

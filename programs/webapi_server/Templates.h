@@ -1,0 +1,84 @@
+#ifndef TALO_PROGRAMS_WEBAPI_SERVER_TEMPLATES_H
+#define TALO_PROGRAMS_WEBAPI_SERVER_TEMPLATES_H
+
+#include <sys/types.h>
+
+#include <array>
+
+#include "programs/webapi_server/Message.h"
+#include "programs/webapi_server/Poller.h"
+#include "programs/webapi_server/Template.h"
+
+// What the templates tell.
+class TemplateEvents {
+  public:
+    virtual ~TemplateEvents() = default;
+    virtual void OnReady(int generation) = 0;
+    virtual void OnStarted(const TemplateReport& report, int process) = 0;
+    virtual void OnFailed(const TemplateReport& report) = 0;
+    virtual void OnEnded(const TemplateReport& report) = 0;
+
+    // Orders of this generation that it did not carry out will not be any more.
+    virtual void OnLost(int generation) = 0;
+};
+
+// The master's side of the templates: the one that workers come from, the one that
+// is being prepared to take its place, and those that finish their orders. A reload
+// goes on while requests are served; a template that cannot be made leaves the one
+// before at work, and is tried again after a while, without its libraries loaded.
+class Templates {
+  public:
+    Templates(const Poller& poller, SlotTable& slots, const Settings& settings,
+              const OriginalProcess& original, TemplateEvents& events);
+    ~Templates();
+    Templates(const Templates&) = delete;
+    Templates& operator=(const Templates&) = delete;
+
+    // Makes a new one as soon as possible.
+    void Reload(const char* reason, long long now);
+
+    // Of the one that workers come from; 0 when there is none.
+    int Generation() const;
+
+    // Orders a worker. The descriptor is its end of the control socket.
+    bool Order(const StartOrder& order, int workerControl);
+
+    void OnMessage(const Event& event, long long now);
+    void Tick(long long now);
+
+  private:
+    enum class State { kNone, kPreparing, kCurrent, kRetiring };
+    struct Handle {
+        State state = State::kNone;
+        pid_t pid = 0;
+        int control = -1;
+        int generation = 0;
+        int pending = 0;  // orders
+        long long since = 0;
+        unsigned serial = 0;
+        bool loadsLibraries = true;
+    };
+
+    Handle* Find(State state);
+    void Launch(long long now);
+    void OnReport(Handle& handle, const TemplateReport& report, int descriptor, long long now);
+    void BecomeCurrent(Handle& handle, long long now);
+    void Retire(Handle& handle);
+    void End(Handle& handle, long long now);
+    void Drop(Handle& handle);
+
+    const Poller& poller_;
+    SlotTable& slots_;
+    const Settings& settings_;
+    const OriginalProcess& original_;
+    TemplateEvents& events_;
+    std::array<Handle, 8> all_;
+    int generation_ = 0;
+    unsigned serial_ = 0;
+    bool isWanted_ = false;  // a new one
+    long long notBefore_ = 0;
+    int failures_ = 0;  // in a row
+    bool libraryFailed_ = false;
+};
+
+#endif

@@ -1,0 +1,257 @@
+#include "programs/webapi_server/Worker.h"
+
+#include <errno.h>
+#include <fcntl.h>
+#include <pthread.h>
+#include <signal.h>
+#include <stdlib.h>
+#include <string.h>
+#include <sys/ioctl.h>
+#include <sys/socket.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <exception>
+#include <string>
+#include <vector>
+
+#include "hosts/linux/sdk/Process.h"
+#include "platform/Paths.h"
+#include "programs/common/CrashReply.h"
+#include "programs/common/DiscardInput.h"
+#include "programs/common/ErrorReply.h"
+#include "programs/webapi_server/Clock.h"
+#include "programs/webapi_server/Environment.h"
+#include "programs/webapi_server/Memory.h"
+#include "programs/webapi_server/Message.h"
+#include "programs/webapi_server/Restore.h"
+#include "programs/webapi_server/Scgi.h"
+#include "programs/webapi_server/WarmEntry.h"
+
+namespace {
+
+// A child of a method's must neither keep the master waiting for this worker's
+// end nor speak for it.
+int controlInChildren = -1;
+
+void LeaveControlInChild() {
+    if (controlInChildren >= 0) {
+        (void)close(controlInChildren);
+        controlInChildren = -1;
+    }
+}
+
+void Log(int priority, const std::string& text) {
+    std::string line = text;
+    std::replace_if(
+        line.begin(), line.end(),
+        [](char byte) { return static_cast<unsigned char>(byte) < 0x20 || byte == 0x7f; }, '?');
+    syslog(priority, "%s", line.c_str());
+}
+
+// What the master does about signals is none of a method's business.
+void ResetSignals() {
+    for (const int number : {SIGTERM, SIGINT, SIGHUP, SIGQUIT, SIGCHLD, SIGUSR1, SIGUSR2}) {
+        (void)signal(number, SIG_DFL);
+    }
+    (void)signal(SIGPIPE, SIG_IGN);
+    sigset_t none;
+    (void)sigemptyset(&none);
+    (void)sigprocmask(SIG_SETMASK, &none, nullptr);
+}
+
+void SendAll(int connection, const ErrorReply& reply) {
+    (void)send(connection, reply.text, reply.size, MSG_NOSIGNAL | MSG_DONTWAIT);
+}
+
+// A method may read its input to the end, which a connection that the web server
+// keeps open does not have. Where all of the body is here already, its end is made;
+// a small one that is just coming is waited for.
+void EndInputBehindBody() {
+    constexpr long long kSmall = 64LL * 1024;
+    constexpr int kMostMilliseconds = 1000;
+    const char* const text = getenv("CONTENT_LENGTH");
+    const long long length = strtoll(text != nullptr ? text : "0", nullptr, 10);
+    int here = 0;
+    for (int waited = 0; ioctl(STDIN_FILENO, FIONREAD, &here) == 0; ++waited) {
+        if (here >= length) {
+            (void)shutdown(STDIN_FILENO, SHUT_RD);
+            return;
+        }
+        if (length > kSmall || waited == kMostMilliseconds) {
+            return;
+        }
+        (void)usleep(1000);
+    }
+}
+
+// Standard input and output while there is no request.
+class Nowhere {
+  public:
+    Nowhere() : nowhere_(open("/dev/null", O_RDWR | O_CLOEXEC)) {
+        Take();
+    }
+    ~Nowhere() {
+        (void)close(nowhere_);
+    }
+    Nowhere(const Nowhere&) = delete;
+    Nowhere& operator=(const Nowhere&) = delete;
+    void Take() const {
+        (void)dup2(nowhere_, STDIN_FILENO);
+        (void)dup2(nowhere_, STDOUT_FILENO);
+    }
+
+  private:
+    int nowhere_;
+};
+
+class Worker {
+  public:
+    Worker(int control, Slot* slot, const Settings& settings)
+        : control_(control),
+          slot_(slot),
+          settings_(settings),
+          process_(getpid()),
+          end_(MillisecondsNow() + settings.workerSeconds * 1000LL),
+          state_(TALO_TASK_DIR) {
+        mostMemory_ = memory_.KiB() + settings.workerGrowthKiB;
+    }
+
+    void Live() {
+        int connection = -1;
+        while (SayIdle() && AwaitConnection(&connection) && Serve(connection) && MayGoOn()) {
+        }
+    }
+
+  private:
+    bool SayIdle() const;
+    bool AwaitConnection(int* connection) const;
+
+    // These answer whether the process may serve another request.
+    bool Serve(int connection);
+    bool ServeRead(const std::vector<std::string>& variables);
+    bool Run();
+    bool PutBack();
+    bool MayGoOn();
+
+    const int control_;
+    Slot* const slot_;
+    const Settings& settings_;
+    const pid_t process_;
+    const long long end_;
+    int served_ = 0;
+    Environment environment_;
+    PrivateMemory memory_;
+    long long mostMemory_ = 0;
+    Nowhere nowhere_;
+    ProcessState state_;
+};
+
+bool Worker::SayIdle() const {
+    const char message = kIdle;
+    return SendMessage(control_, &message, sizeof message, -1, 0);
+}
+
+// False when there is nothing more to do here.
+bool Worker::AwaitConnection(int* connection) const {
+    char order = kLeave;
+    const ssize_t size = ReceiveMessage(control_, &order, sizeof order, connection, 0);
+    if (size == sizeof order && order == kServe && *connection >= 0) {
+        return true;
+    }
+    if (size > 0 && *connection >= 0) {
+        (void)close(*connection);
+    }
+    return false;
+}
+
+bool Worker::Serve(int connection) {
+    slot_->answerBegun = 0;
+    slot_->transfers = 0;
+    std::memset(slot_->api, 0, sizeof slot_->api);
+    slot_->allowedMs = settings_.deadlineSeconds * 1000LL;
+    slot_->began = MillisecondsNow();
+    std::vector<std::string> variables;
+    std::string reason;
+    const ScgiResult result = ReadScgiRequest(connection, ScgiLimits(), &variables, &reason);
+    if (result == ScgiResult::kRead) {
+        (void)dup2(connection, STDIN_FILENO);
+        (void)dup2(connection, STDOUT_FILENO);
+        (void)close(connection);
+        return ServeRead(variables);
+    }
+    Log(LOG_WARNING, "a request cannot be read: " + reason);
+    if (result != ScgiResult::kGone) {
+        slot_->answerBegun = 1;
+        SendAll(connection, ReplyFor(ReplyStatus::kBadRequest));
+    }
+    (void)shutdown(connection, SHUT_RDWR);
+    (void)close(connection);
+    slot_->began = 0;
+    return true;
+}
+
+// The reply ends for the web server before the rest of the body is taken: it has
+// no more to say then, and closes its side.
+bool Worker::ServeRead(const std::vector<std::string>& variables) {
+    environment_.Enter(variables);
+    EndInputBehindBody();
+    BeginCrashReply(&slot_->answerBegun);
+    const bool livesOn = Run();
+    EndCrashReply();
+    (void)shutdown(STDOUT_FILENO, SHUT_WR);
+    DiscardInput();
+    (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
+    nowhere_.Take();
+    const bool back = livesOn && PutBack();
+    slot_->began = 0;
+    return back;
+}
+
+bool Worker::Run() {
+    WarmEntry entry(slot_, settings_.deadlineSeconds);
+    entry.SetArgs(1, &program_invocation_name);
+    (void)entry.Run(Json::Value());
+    // A child of a method's that found its way here has no request to end.
+    if (getpid() != process_) {
+        _exit(0);
+    }
+    (void)fflush(stdout);
+    return entry.LeavesNothingBehind();
+}
+
+bool Worker::PutBack() {
+    talo::ForgetRequest();
+    environment_.Leave();
+    const std::vector<std::string> changes = state_.Restore();
+    for (const std::string& change : changes) {
+        Log(LOG_ERR, std::string(slot_->api) + " left something behind: " + change);
+    }
+    return changes.empty();
+}
+
+bool Worker::MayGoOn() {
+    ++served_;
+    return served_ < settings_.workerRequests && MillisecondsNow() < end_ &&
+           memory_.KiB() <= mostMemory_;
+}
+
+}  // namespace
+
+int RunWorker(int control, Slot* slot, const Settings& settings) {
+    static const bool registered = pthread_atfork(nullptr, nullptr, LeaveControlInChild) == 0;
+    (void)registered;
+    try {
+        ResetSignals();
+        controlInChildren = control;
+        slot->pid = getpid();
+        TALO::WebEntry::WatchAnswer(&slot->answerBegun);
+        Worker(control, slot, settings).Live();
+    } catch (const std::exception& trouble) {
+        Log(LOG_ERR, std::string("the worker ends: ") + trouble.what());
+    }
+    controlInChildren = -1;
+    return 0;
+}

@@ -1,0 +1,230 @@
+#include "programs/webapi_server/Workers.h"
+
+#include <errno.h>
+#include <sys/socket.h>
+#include <syslog.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+#include "programs/webapi_server/Clock.h"
+
+namespace {
+
+constexpr long long kFirstPause = 100;
+constexpr int kMostDoublings = 6;
+
+}  // namespace
+
+Workers::Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
+                 ConnectionQueue& queue, Farewell& farewell)
+    : poller_(poller),
+      slots_(slots),
+      settings_(settings),
+      queue_(queue),
+      farewell_(farewell),
+      pool_(settings.minWorkers, settings.maxWorkers) {}
+
+Workers::~Workers() {
+    for (int index = 0; index < pool_.Size(); ++index) {
+        CloseDescriptors(pool_.At(index));
+        if (pool_.At(index).connection >= 0) {
+            (void)close(pool_.At(index).connection);
+        }
+    }
+}
+
+bool Workers::HandOver(const Waiting& waiting, long long now) {
+    for (int index = pool_.ChooseIdle(); index >= 0; index = pool_.ChooseIdle()) {
+        PooledWorker& worker = pool_.At(index);
+        slots_.Clear(index);
+        const char message = kServe;
+        if (SendMessage(worker.control, &message, sizeof message, waiting.connection,
+                        MSG_DONTWAIT)) {
+            worker.connection = waiting.connection;
+            worker.returns = waiting.returns;
+            worker.quietSince = now;
+            worker.progressAt = 0;
+            worker.isTimedOut = false;
+            pool_.SetState(index, WorkerState::kBusy, now);
+            return true;
+        }
+        // It has just ended.
+        pool_.SetState(index, WorkerState::kLeaving, now);
+    }
+    return false;
+}
+
+void Workers::Grow(long long now) {
+    const int generation = templates_->Generation();
+    if (generation == 0 || now < startNotBefore_) {
+        return;
+    }
+    for (int count = pool_.ToStart(generation, queue_.Size()); count > 0; --count) {
+        if (!Start(generation, now)) {
+            return;
+        }
+    }
+}
+
+bool Workers::Start(int generation, long long now) {
+    int ends[2] = {-1, -1};
+    const int index = pool_.Reserve(generation, now);
+    if (index < 0) {
+        return false;
+    }
+    PooledWorker& worker = pool_.At(index);
+    slots_.Clear(index);
+    bool ordered = false;
+    if (socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends) == 0) {
+        worker.control = ends[0];
+        ordered = poller_.Add(ends[0], {Source::kControl, index, worker.serial}) &&
+                  templates_->Order({index, worker.serial}, ends[1]);
+        (void)close(ends[1]);
+    }
+    if (!ordered) {
+        CloseDescriptors(worker);
+        pool_.Free(index);
+        PauseStarting(now);
+    }
+    return ordered;
+}
+
+void Workers::OnControl(const Event& event, long long now) {
+    const int index = pool_.Find(event.index, event.serial);
+    if (index < 0 || pool_.At(index).control < 0) {
+        return;
+    }
+    char message = 0;
+    int descriptor = -1;
+    const ssize_t got = ReceiveMessage(pool_.At(index).control, &message, sizeof message,
+                                       &descriptor, MSG_DONTWAIT);
+    if (descriptor >= 0) {
+        (void)close(descriptor);
+    }
+    if (got == 1 && message == kIdle) {
+        BecomeIdle(index, now);
+    } else if (got == 0 || (got < 0 && errno != EAGAIN)) {
+        // The process descriptor tells of the end; this one would not be quiet.
+        poller_.Remove(pool_.At(index).control);
+        if (pool_.At(index).process < 0) {
+            End(index, now);
+        }
+    }
+}
+
+void Workers::BecomeIdle(int index, long long now) {
+    PooledWorker& worker = pool_.At(index);
+    if (worker.state == WorkerState::kBusy) {
+        // Of a request that could not be read, the rest may still be there.
+        farewell_.Close(worker.connection, now);
+        worker.connection = -1;
+    } else if (worker.state != WorkerState::kStarting) {
+        return;
+    }
+    worker.wasIdle = true;
+    startFailures_ = 0;
+    pool_.SetState(index, WorkerState::kIdle, now);
+    DismissOlder(now);
+}
+
+// Those of a template that was replaced, once there is another to serve.
+void Workers::DismissOlder(long long now) {
+    const int generation = templates_->Generation();
+    if (generation == 0 ||
+        pool_.Count(WorkerState::kIdle, generation) + pool_.Count(WorkerState::kBusy, generation) ==
+            0) {
+        return;
+    }
+    for (int index = 0; index < pool_.Size(); ++index) {
+        if (pool_.At(index).state == WorkerState::kIdle &&
+            pool_.At(index).generation != generation) {
+            Dismiss(index, now);
+        }
+    }
+}
+
+void Workers::Dismiss(int index, long long now) {
+    const char message = kLeave;
+    (void)SendMessage(pool_.At(index).control, &message, sizeof message, -1, MSG_DONTWAIT);
+    pool_.SetState(index, WorkerState::kLeaving, now);
+}
+
+void Workers::DismissAll(long long now) {
+    for (int index = 0; index < pool_.Size(); ++index) {
+        const WorkerState state = pool_.At(index).state;
+        if (state == WorkerState::kIdle || state == WorkerState::kStarting) {
+            Dismiss(index, now);
+        }
+    }
+}
+
+void Workers::PauseStarting(long long now) {
+    startNotBefore_ = now + (kFirstPause << std::min(startFailures_, kMostDoublings));
+    ++startFailures_;
+}
+
+void Workers::CloseDescriptors(PooledWorker& worker) const {
+    for (int* descriptor : {&worker.control, &worker.process}) {
+        if (*descriptor >= 0) {
+            poller_.Remove(*descriptor);
+            (void)close(*descriptor);
+            *descriptor = -1;
+        }
+    }
+}
+
+void Workers::OnReady(int) {
+    startNotBefore_ = 0;
+}
+
+void Workers::OnStarted(const TemplateReport& report, int process) {
+    const int index = pool_.Find(report.slot, report.serial);
+    if (index >= 0 && pool_.At(index).process < 0 && pool_.At(index).state != WorkerState::kEnded) {
+        pool_.At(index).pid = report.pid;
+        pool_.At(index).process = process;
+        if (process >= 0) {
+            (void)poller_.Add(process, {Source::kProcess, index, report.serial});
+        }
+    } else if (process >= 0) {
+        (void)close(process);
+    }
+}
+
+void Workers::OnFailed(const TemplateReport& report) {
+    const int index = pool_.Find(report.slot, report.serial);
+    if (index >= 0) {
+        errno = report.status;
+        syslog(LOG_ERR, "cannot start a worker: %m");
+        CloseDescriptors(pool_.At(index));
+        pool_.Free(index);
+        PauseStarting(MillisecondsNow());
+    }
+}
+
+void Workers::OnEnded(const TemplateReport& report) {
+    const int index = pool_.Find(report.slot, report.serial);
+    if (index >= 0) {
+        TakeStatus(index, report.status);
+    }
+}
+
+void Workers::OnLost(int generation) {
+    const long long now = MillisecondsNow();
+    for (int index = 0; index < pool_.Size(); ++index) {
+        const PooledWorker& worker = pool_.At(index);
+        if (worker.state == WorkerState::kStarting && worker.generation == generation &&
+            worker.process < 0) {
+            CloseDescriptors(pool_.At(index));
+            // Not free at once: it may have been forked, and knows its slot.
+            pool_.SetState(index, WorkerState::kEnded, now);
+        }
+    }
+}
+
+void Workers::OnOrphan(pid_t pid, int status) {
+    const int index = pool_.FindProcess(pid);
+    if (index >= 0) {
+        TakeStatus(index, status);
+    }
+}

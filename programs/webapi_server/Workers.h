@@ -1,0 +1,89 @@
+#ifndef TALO_PROGRAMS_WEBAPI_SERVER_WORKERS_H
+#define TALO_PROGRAMS_WEBAPI_SERVER_WORKERS_H
+
+#include <string>
+
+#include "programs/webapi_server/Farewell.h"
+#include "programs/webapi_server/Pool.h"
+#include "programs/webapi_server/Queue.h"
+#include "programs/webapi_server/SlotTable.h"
+#include "programs/webapi_server/Templates.h"
+
+// The master's side of the workers: starts them, hands requests over, sees to it that
+// each request is answered whatever becomes of its worker. The master has a duplicate
+// of every connection until its worker is done with it.
+class Workers : public TemplateEvents {
+  public:
+    Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
+            ConnectionQueue& queue, Farewell& farewell);
+    ~Workers() override;
+    Workers(const Workers&) = delete;
+    Workers& operator=(const Workers&) = delete;
+
+    // Must outlive this, and be there before anything starts.
+    void SetTemplates(Templates* templates) {
+        templates_ = templates;
+    }
+
+    // Hands the connection to an idle worker. False when there is none.
+    bool HandOver(const Waiting& waiting, long long now);
+
+    // Starts what is wanted while so many requests wait.
+    void Grow(long long now);
+
+    void OnControl(const Event& event, long long now);
+    void OnProcess(const Event& event, long long now);
+
+    // A child of the master has ended: perhaps a worker whose template went before.
+    void OnOrphan(pid_t pid, int status);
+
+    // Deadlines, and whatever else only time tells.
+    void Tick(long long now);
+
+    // Tells those who have no request to go.
+    void DismissAll(long long now);
+
+    // Those who have one have had their time.
+    void EndAllInTime();
+
+    bool AreBusy() const {
+        return pool_.Count(WorkerState::kBusy) > 0;
+    }
+    bool AreGone() const {
+        return pool_.Count(WorkerState::kFree) + pool_.Count(WorkerState::kEnded) == pool_.Size();
+    }
+
+    void OnReady(int generation) override;
+    void OnStarted(const TemplateReport& report, int process) override;
+    void OnFailed(const TemplateReport& report) override;
+    void OnEnded(const TemplateReport& report) override;
+    void OnLost(int generation) override;
+
+  private:
+    bool Start(int generation, long long now);
+    void BecomeIdle(int index, long long now);
+    void Dismiss(int index, long long now);
+    void DismissOlder(long long now);
+    bool IsPastDeadline(PooledWorker& worker, const Slot& slot, long long now) const;
+    void EndInTime(int index);
+    void Kill(int index) const;
+    void End(int index, long long now);
+    void SettleConnection(int index, long long now);
+    void TakeStatus(int index, int status);
+    void Finish(int index);
+    void CloseDescriptors(PooledWorker& worker) const;
+    void PauseStarting(long long now);
+    std::string ApiOf(int index) const;
+
+    const Poller& poller_;
+    SlotTable& slots_;
+    const Settings& settings_;
+    ConnectionQueue& queue_;
+    Farewell& farewell_;
+    Templates* templates_ = nullptr;
+    Pool pool_;
+    long long startNotBefore_ = 0;
+    int startFailures_ = 0;  // in a row
+};
+
+#endif

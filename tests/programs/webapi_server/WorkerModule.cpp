@@ -1,0 +1,89 @@
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <iostream>
+#include <string>
+
+#include "webapi/APIRequest.h"
+#include "webapi/APIResponse.h"
+#include "webapi/APITable.h"
+
+// Methods that behave, and methods that leave something behind.
+
+namespace {
+
+using TALO::APIRequest;
+using TALO::APIResponse;
+
+std::string Text(APIRequest* request, const char* name) {
+    return request->GetAndCheckString(name, APIRequest::OPTIONAL, nullptr).Get("");
+}
+
+void Echo(APIRequest* request, APIResponse* response) {
+    Json::Value data;
+    data["text"] = Text(request, "text");
+    data["pid"] = static_cast<int>(getpid());
+    response->SetSuccess(data);
+}
+
+void Variable(APIRequest* request, APIResponse* response) {
+    const char* value = getenv(Text(request, "name").c_str());
+    response->SetSuccess(value != nullptr ? Json::Value(value) : Json::Value());
+}
+
+void Leave(APIRequest* request, APIResponse* response) {
+    const std::string what = Text(request, "what");
+    if (what == "folder") {
+        (void)!chdir("/");
+    } else if (what == "descriptor") {
+        (void)!open("/dev/null", O_RDONLY);
+    } else if (what == "mask") {
+        (void)umask(0);
+    } else if (what == "variable") {
+        (void)setenv("LEFT_BEHIND", "yes", 1);
+    } else if (what == "memory") {
+        constexpr size_t kSize = 4U << 20;
+        auto* left = static_cast<volatile char*>(malloc(kSize));
+        for (size_t at = 0; at < kSize; at += 1024) {
+            left[at] = 'x';
+        }
+    }
+    response->SetSuccess(what);
+}
+
+// Answers the id of a child that stays for as long as nobody ends it.
+void Child(APIRequest*, APIResponse* response) {
+    const pid_t child = fork();
+    if (child == 0) {
+        (void)pause();
+        _exit(0);
+    }
+    response->SetSuccess(static_cast<int>(child));
+}
+
+void Crash(APIRequest*, APIResponse*) {
+    (void)signal(SIGUSR1, SIG_DFL);
+    abort();
+}
+
+void Raw(APIRequest*, APIResponse* response) {
+    response->SetEnableOutput(false);
+    std::cout << "Content-Type: text/plain\r\n\r\nraw";
+}
+
+TALO::_tag_API_TABLE table[] = {
+    {"Test.Lives", 1, "echo", Echo},   {"Test.Lives", 1, "variable", Variable},
+    {"Test.Lives", 1, "leave", Leave}, {"Test.Lives", 1, "child", Child},
+    {"Test.Lives", 1, "crash", Crash}, {"Test.Lives", 1, "raw", Raw},
+    {"Test.Ends", 1, "echo", Echo},    {nullptr, 0, nullptr, nullptr},
+};
+
+}  // namespace
+
+WEBAPI_LIBRARY_EXPORT TALO::_tag_API_TABLE* GetAPITable() {
+    return table;
+}

@@ -1,0 +1,331 @@
+#include "programs/webapi_server/Worker.h"
+
+#include <gtest/gtest.h>
+#include <poll.h>
+#include <sys/mman.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <new>
+#include <string>
+
+#include "programs/common/ErrorReply.h"
+#include "programs/webapi_server/Message.h"
+#include "tests/programs/webapi_server/Netstring.h"
+#include "tests/support/Json.h"
+#include "tests/support/TempFolder.h"
+
+namespace {
+
+constexpr int kPatience = 20000;  // milliseconds
+
+const char kLives[] = R"({"Test.Lives": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
+    "authLevel": 0, "isolation": "worker", "deadline": 7, "methods": {"1": ["echo", "variable",
+    "leave", "child", "crash", {"raw": {"allowDownload": true}}]}}})";
+const char kEnds[] = R"({"Test.Ends": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
+    "authLevel": 0, "methods": {"1": ["echo"]}}})";
+const char kCompound[] = R"({"TALO.Entry.Request": {"lib": "", "minVersion": 1, "maxVersion": 1,
+    "authLevel": 0, "methods": {"1": ["request"]}}})";
+
+std::string WithModule(std::string description) {
+    return description.replace(description.find("MODULE"), 6, WORKER_MODULE);
+}
+
+std::string ReadAll(int from) {
+    std::string content;
+    char block[4096];
+    struct pollfd input = {from, POLLIN, 0};
+    while (poll(&input, 1, kPatience) == 1) {
+        const ssize_t size = read(from, block, sizeof block);
+        if (size <= 0) {
+            return content;
+        }
+        content.append(block, static_cast<size_t>(size));
+    }
+    ADD_FAILURE() << "the worker keeps its connection";
+    return content;
+}
+
+// A worker in a child process, and the master's part in its life.
+class WorkerLife : public testing::Test {
+  protected:
+    WorkerLife() {
+        (void)folder_.Write("Test.Lives.lib", WithModule(kLives));
+        (void)folder_.Write("Test.Ends.lib", WithModule(kEnds));
+        (void)folder_.Write("TALO.Entry.Request.lib", kCompound);
+        void* memory =
+            mmap(nullptr, sizeof(Slot), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
+        slot_ = new (memory) Slot();
+    }
+    ~WorkerLife() override {
+        if (control_ >= 0) {
+            (void)close(control_);
+        }
+        if (worker_ > 0) {
+            (void)kill(worker_, SIGKILL);
+            (void)waitpid(worker_, nullptr, 0);
+        }
+        (void)munmap(slot_, sizeof(Slot));
+    }
+
+    void Start() {
+        int ends[2];
+        ASSERT_EQ(0, socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends));
+        worker_ = fork();
+        if (worker_ == 0) {
+            const struct rlimit none = {0, 0};
+            (void)setrlimit(RLIMIT_CORE, &none);
+            (void)close(ends[0]);
+            (void)!chdir(folder_.Path("").c_str());
+            _exit(RunWorker(ends[1], slot_, settings_));
+        }
+        (void)close(ends[1]);
+        control_ = ends[0];
+        ASSERT_TRUE(SaysIdle());
+    }
+
+    // False when the worker has closed its side instead.
+    bool SaysIdle() const {
+        struct pollfd input = {control_, POLLIN, 0};
+        EXPECT_EQ(1, poll(&input, 1, kPatience));
+        char message = 0;
+        return recv(control_, &message, 1, 0) == 1 && message == kIdle;
+    }
+
+    // The web server's end of a connection that the worker got.
+    int Connect() const {
+        int ends[2];
+        EXPECT_EQ(0, socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends));
+        const char order = kServe;
+        EXPECT_TRUE(SendMessage(control_, &order, 1, ends[1], 0));
+        (void)close(ends[1]);
+        return ends[0];
+    }
+
+    std::string Exchange(const std::string& bytes) const {
+        const int connection = Connect();
+        EXPECT_EQ(static_cast<ssize_t>(bytes.size()),
+                  write(connection, bytes.data(), bytes.size()));
+        std::string reply = ReadAll(connection);
+        (void)close(connection);
+        return reply;
+    }
+
+    std::string Get(const std::string& query) const {
+        return Exchange(support::HeaderBlock({{"CONTENT_LENGTH", "0"},
+                                              {"SCGI", "1"},
+                                              {"REQUEST_METHOD", "GET"},
+                                              {"REMOTE_ADDR", "192.0.2.1"},
+                                              {"QUERY_STRING", query}}));
+    }
+    std::string Call(const std::string& method, const std::string& more = "") const {
+        return Get("api=Test.Lives&version=1&method=" + method + "&" + more);
+    }
+    std::string Post(const std::string& form) const {
+        return Exchange(support::HeaderBlock({{"CONTENT_LENGTH", std::to_string(form.size())},
+                                              {"SCGI", "1"},
+                                              {"REQUEST_METHOD", "POST"},
+                                              {"CONTENT_TYPE", "application/x-www-form-urlencoded"},
+                                              {"REMOTE_ADDR", "192.0.2.1"}}) +
+                        form);
+    }
+
+    // The worker's exit status, or 1000 + the signal that ended it.
+    int Ended() {
+        EXPECT_FALSE(SaysIdle());
+        int status = 0;
+        EXPECT_EQ(worker_, waitpid(worker_, &status, 0));
+        worker_ = -1;
+        return WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status);
+    }
+
+    support::TempFolder folder_;
+    Settings settings_;
+    Slot* slot_;
+    pid_t worker_ = -1;
+    int control_ = -1;
+};
+
+Json::Value Body(const std::string& reply) {
+    const size_t end = reply.find("\r\n\r\n");
+    Json::Value body;
+    Json::Reader reader;
+    EXPECT_TRUE(end != std::string::npos && reader.parse(reply.substr(end + 4), body)) << reply;
+    return body;
+}
+
+std::string Text(const ErrorReply& reply) {
+    return std::string(reply.text, reply.size);
+}
+
+}  // namespace
+
+TEST_F(WorkerLife, ServesOneRequestAfterTheOther) {
+    Start();
+    for (int number = 0; number < 50; ++number) {
+        const Json::Value body = Body(Call("echo", "text=n" + std::to_string(number)));
+        EXPECT_EQ("n" + std::to_string(number), body["data"]["text"].asString());
+        EXPECT_EQ(worker_, body["data"]["pid"].asInt());
+        ASSERT_TRUE(SaysIdle());
+    }
+    EXPECT_EQ(worker_, slot_->pid);
+}
+
+TEST_F(WorkerLife, ServesABodyAndLeavesNoneOfItToTheNextRequest) {
+    Start();
+    const std::string form = "api=Test.Lives&version=1&method=echo&text=posted";
+    EXPECT_EQ("posted", Body(Post(form))["data"]["text"].asString());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ("posted",
+              Body(Post(form + "&x=" + std::string(100000, 'x')))["data"]["text"].asString());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ("", Body(Call("echo"))["data"]["text"].asString());
+}
+
+TEST_F(WorkerLife, EndsAfterARequestToAnAPIThatPromisesNothing) {
+    Start();
+    EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo&text=x"))["success"].asBool());
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerLife, EndsWhenOneElementOfACompoundPromisesNothing) {
+    Start();
+    const std::string lives = R"({"api":"Test.Lives","version":1,"method":"echo"})";
+    const std::string ends = R"({"api":"Test.Ends","version":1,"method":"echo"})";
+    const std::string call = "api=TALO.Entry.Request&version=1&method=request&compound=";
+    EXPECT_FALSE(Body(Post(call + "[" + lives + "," + lives + "]"))["data"]["has_fail"].asBool());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_FALSE(Body(Post(call + "[" + lives + "," + ends + "]"))["data"]["has_fail"].asBool());
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerLife, GoesOnAfterACallThatOpensNoLibrary) {
+    Start();
+    EXPECT_EQ(102, Body(Get("api=Test.Nobody&version=1&method=x"))["error"]["code"].asInt());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ(101, Body(Get(""))["error"]["code"].asInt());
+    EXPECT_TRUE(SaysIdle());
+}
+
+TEST_F(WorkerLife, EndsWhenAMethodBreaksItsPromise) {
+    for (const char* what : {"folder", "descriptor", "mask"}) {
+        SCOPED_TRACE(what);
+        Start();
+        EXPECT_TRUE(Body(Call("leave", std::string("what=") + what))["success"].asBool());
+        EXPECT_EQ(0, Ended());
+        (void)close(control_);
+        control_ = -1;
+    }
+}
+
+TEST_F(WorkerLife, TakesItsEnvironmentFromTheRequestAlone) {
+    Start();
+    (void)Call("leave", "what=variable");
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(Body(Call("variable", "name=LEFT_BEHIND"))["data"].empty());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ("192.0.2.1", Body(Call("variable", "name=REMOTE_ADDR"))["data"].asString());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(Body(Call("variable", "name=CONTENT_TYPE"))["data"].empty());
+}
+
+TEST_F(WorkerLife, EndsAtItsNumberOfRequests) {
+    settings_.workerRequests = 3;
+    Start();
+    (void)Call("echo");
+    ASSERT_TRUE(SaysIdle());
+    (void)Call("echo");
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerLife, EndsWhenItHasGrown) {
+    settings_.workerGrowthKiB = 16 * 1024;
+    Start();
+    int calls = 0;
+    do {
+        (void)Call("leave", "what=memory");
+        ++calls;
+    } while (calls < 40 && SaysIdle());
+    EXPECT_GT(calls, 2);
+    EXPECT_LT(calls, 6);
+}
+
+TEST_F(WorkerLife, EndsAtItsAge) {
+    settings_.workerSeconds = 0;
+    Start();
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerLife, LeavesWhenItIsToldToAndWhenTheMasterIsGone) {
+    Start();
+    const char order = kLeave;
+    ASSERT_TRUE(SendMessage(control_, &order, 1, -1, 0));
+    EXPECT_EQ(0, Ended());
+    (void)close(control_);
+    Start();
+    (void)shutdown(control_, SHUT_RDWR);
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerLife, AnswersWhatIsNoRequestAndGoesOn) {
+    Start();
+    EXPECT_EQ(Text(ReplyFor(ReplyStatus::kBadRequest)), Exchange("GET / HTTP/1.1\r\n\r\n"));
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ(Text(ReplyFor(ReplyStatus::kBadRequest)), Exchange("70000:"));
+    ASSERT_TRUE(SaysIdle());
+    (void)close(Connect());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+}
+
+TEST_F(WorkerLife, AnswersWhenAMethodCrashes) {
+    Start();
+    EXPECT_EQ(Text(ReplyFor(ReplyStatus::kCrashed)), Call("crash"));
+    EXPECT_EQ(1000 + SIGABRT, Ended());
+    EXPECT_EQ(1, slot_->answerBegun);
+}
+
+TEST_F(WorkerLife, SendsWhatAMethodWritesItself) {
+    Start();
+    EXPECT_EQ("Content-Type: text/plain\r\n\r\nraw", Call("raw"));
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ(1, slot_->transfers);
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+}
+
+TEST_F(WorkerLife, ShowsWhatItRuns) {
+    Start();
+    (void)Call("echo");
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_STREQ("Test.Lives", slot_->api);
+    EXPECT_EQ(0, slot_->began);
+    EXPECT_EQ(0, slot_->transfers);
+    EXPECT_EQ(1, slot_->answerBegun);
+    EXPECT_GE(slot_->allowedMs, 7000);
+    EXPECT_LT(slot_->allowedMs, 7000 + kPatience);
+}
+
+TEST_F(WorkerLife, AllowsAnAPIWithoutADeadlineWhatTheServerAllows) {
+    settings_.deadlineSeconds = 60;
+    Start();
+    (void)Get("api=Test.Ends&version=1&method=echo");
+    (void)Ended();
+    EXPECT_GE(slot_->allowedMs, 60000);
+    EXPECT_LT(slot_->allowedMs, 60000 + kPatience);
+}
+
+TEST_F(WorkerLife, LeavesNoConnectionToAChildOfAMethod) {
+    Start();
+    const int child = Body(Call("child"))["data"].asInt();
+    ASSERT_GT(child, 0);
+    ASSERT_TRUE(SaysIdle());
+    const char order = kLeave;
+    ASSERT_TRUE(SendMessage(control_, &order, 1, -1, 0));
+    EXPECT_EQ(0, Ended());
+    EXPECT_EQ(0, kill(child, SIGKILL));
+}

@@ -1,0 +1,412 @@
+"""webapi-server as a process: what web servers get of it, whatever becomes of its parts."""
+
+import contextlib
+import os
+import random
+import signal
+import socket
+import stat
+import subprocess
+import threading
+import time
+import unittest
+
+import scgi_server
+from scgi_server import LIVING, LONG, ONCE, SERVER, Reply, query_request, wait_for
+
+
+class Answers(scgi_server.ServerTest):
+    def test_answers_a_request(self):
+        self.start()
+        self.assertEqual(self.echo()["nonce"], "n")
+        self.assertEqual(self.echo(ONCE)["nonce"], "n")
+
+    def test_serves_one_request_after_the_other_with_a_living_worker(self):
+        self.start("--max-workers", "1", "--min-workers", "1")
+        first = self.echo()
+        second = self.echo()
+        self.assertEqual(second["pid"], first["pid"])
+        self.assertEqual(second["served"], 2)
+
+    def test_serves_each_request_with_a_process_of_its_own(self):
+        self.start()
+        replies = [self.echo(ONCE) for _ in range(20)]
+        self.assertEqual(len({reply["pid"] for reply in replies}), 20)
+        self.assertEqual({reply["served"] for reply in replies}, {1})
+
+    def test_gives_each_client_its_own_answer(self):
+        self.start("--max-workers", "8")
+        wrong = []
+
+        def client(number):
+            for count in range(50):
+                nonce = f"c{number}-{count}"
+                reply = self.ask(ONCE if count % 5 == 0 else LIVING, "echo", nonce=nonce)
+                if reply.body.get("data", {}).get("nonce") != nonce:
+                    wrong.append(reply.raw)
+
+        clients = [threading.Thread(target=client, args=(number,)) for number in range(8)]
+        for thread in clients:
+            thread.start()
+        for thread in clients:
+            thread.join()
+        self.assertEqual(wrong, [])
+
+    def test_lets_requests_wait_until_there_is_a_worker(self):
+        self.start("--min-workers", "1", "--max-workers", "2")
+        connections = [self.connect() for _ in range(10)]
+        for number, connection in enumerate(connections):
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=50, nonce=f"w{number}"))
+        for number, connection in enumerate(connections):
+            with connection:
+                reply = Reply(self.read_all(connection))
+            self.assertEqual(reply.body["data"]["nonce"], f"w{number}")
+
+    def test_answers_503_when_too_many_wait(self):
+        self.start("--min-workers", "1", "--max-workers", "1", "--queue", "2")
+        self.echo()
+        connections = [self.connect() for _ in range(8)]
+        for connection in connections:
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=300))
+        replies = []
+        for connection in connections:
+            with connection:
+                replies.append(Reply(self.read_all(connection)))
+        refused = [reply for reply in replies if reply.status == 503]
+        # One may have come before the worker was ready again.
+        self.assertIn(len(refused), (5, 6))
+        for reply in refused:
+            self.assertEqual(reply.body, {"success": False, "error": {"code": 100}})
+        served = sum(reply.body["success"] for reply in replies)
+        self.assertEqual(served + len(refused), len(replies))
+
+    def test_answers_503_to_who_is_still_sending(self):
+        self.start("--min-workers", "1", "--max-workers", "1", "--queue", "1")
+        self.echo()
+        busy = [self.connect() for _ in range(2)]
+        for connection in busy:
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=500))
+        with self.connect() as connection:
+            connection.sendall(query_request(LIVING, "echo") + b"x" * (4 << 20))
+            self.assertEqual(Reply(self.read_all(connection)).status, 503)
+        for connection in busy:
+            connection.close()
+
+    def test_answers_500_when_a_method_crashes(self):
+        self.start()
+        for method in ("crash", "vanish"):
+            for api in (LIVING, ONCE):
+                reply = self.ask(api, method)
+                self.assertEqual(reply.status, 500, (method, api))
+                self.assertEqual(reply.body, {"success": False, "error": {"code": 117}})
+        self.echo()
+
+    def test_answers_504_when_a_method_hangs(self):
+        self.start()
+        for method in ("hang", "hangWithChild"):
+            reply = self.ask(LIVING, method)
+            self.assertEqual(reply.status, 504)
+            self.assertEqual(reply.body, {"success": False, "error": {"code": 117}})
+        # The master, the template, and workers: none of them the method's child.
+        self.assertTrue(wait_for(lambda: len(self.processes()) == 4), self.processes())
+
+    def test_lets_a_download_that_makes_progress_go_on(self):
+        self.start()
+        self.assertEqual(self.raw(LIVING, "stream").partition(b"\r\n\r\n")[2], 15 * b"part ")
+
+    def test_ends_a_download_that_makes_none(self):
+        self.start()
+        self.assertEqual(self.raw(LIVING, "stall").partition(b"\r\n\r\n")[2], b"part ")
+        self.echo()
+
+    def test_serves_others_when_a_library_cannot_be_loaded(self):
+        self.libraries[scgi_server.BAD] = scgi_server.BAD_MODULE
+        self.describe(scgi_server.BAD)
+        self.addCleanup(self.forget, scgi_server.BAD)
+        self.start()
+        self.echo()
+        self.echo(ONCE)
+        self.assertEqual(self.ask(scgi_server.BAD, "echo").status, 500)
+        self.echo()
+
+    def test_outlives_clients_that_have_gone(self):
+        self.start("--min-workers", "1", "--max-workers", "2")
+        for cut in range(0, 60, 7):
+            with self.connect() as connection:
+                connection.sendall(query_request(LIVING, "echo")[:cut])
+        self.echo()
+
+    def test_answers_400_to_what_is_no_request(self):
+        self.start()
+        with self.connect() as connection:
+            connection.sendall(b"GET / HTTP/1.0\r\n\r\n")
+            self.assertEqual(Reply(self.read_all(connection)).status, 400)
+
+
+class Workers(scgi_server.ServerTest):
+    def test_has_workers_ready_and_more_under_load(self):
+        self.start("--min-workers", "2", "--max-workers", "6")
+        self.assertTrue(wait_for(lambda: len(self.processes()) == 4), self.processes())
+        connections = [self.connect() for _ in range(6)]
+        for connection in connections:
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=800))
+        self.assertTrue(wait_for(lambda: len(self.processes()) == 8), self.processes())
+        for connection in connections:
+            with connection:
+                self.read_all(connection)
+        self.assertLessEqual(len(self.processes()), 8)
+
+    def test_replaces_a_worker_that_died_while_idle(self):
+        server = self.start("--min-workers", "6")
+        self.echo()
+        template = self.children(server.pid)[0]
+        wait_for(lambda: len(self.children(template)) == 6)
+        before = self.children(template)
+        for worker in before:
+            os.kill(worker, signal.SIGKILL)
+        self.assertNotIn(self.echo()["pid"], before)
+        self.assertTrue(wait_for(lambda: len(self.children(template)) == 6))
+
+    def test_replaces_a_template_that_died(self):
+        server = self.start()
+        self.echo(ONCE)
+        template = self.children(server.pid)[0]
+        os.kill(template, signal.SIGKILL)
+        for _ in range(5):
+            self.echo(ONCE)
+        self.assertNotIn(template, self.children(server.pid))
+
+    def test_gives_a_worker_no_descriptor_but_its_own(self):
+        server = self.start("--max-workers", "4")
+        busy = [self.connect() for _ in range(3)]
+        for connection in busy:
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=600))
+        time.sleep(0.3)
+        seen = {}
+        for worker in [pid for pid in self.processes() if pid != server.pid]:
+            for number in os.listdir(f"/proc/{worker}/fd"):
+                try:
+                    target = os.readlink(f"/proc/{worker}/fd/{number}")
+                except FileNotFoundError:
+                    continue
+                if target.startswith("socket:"):
+                    seen.setdefault(target, set()).add(worker)
+        self.assertTrue(seen)
+        shared = {target: users for target, users in seen.items() if len(users) > 1}
+        for connection in busy:
+            with connection:
+                self.read_all(connection)
+        self.assertEqual(shared, {})
+
+    def test_keeps_no_descriptor_of_a_request(self):
+        server = self.start("--min-workers", "1", "--max-workers", "1")
+        self.echo()
+
+        def descriptors():
+            folder = f"/proc/{server.pid}/fd"
+            found = []
+            for name in os.listdir(folder):
+                # One may be closed between the two looks.
+                with contextlib.suppress(FileNotFoundError):
+                    found.append(os.readlink(f"{folder}/{name}").split(":")[0])
+            return found
+
+        looks = []
+        while looks[-5:] != 5 * looks[-1:] or len(looks) < 5:
+            time.sleep(0.1)
+            looks.append(sorted(descriptors()))
+        before = looks[-1]
+        for _ in range(100):
+            self.echo()
+        self.ask(LIVING, "vanish")
+        self.echo()
+        self.assertTrue(wait_for(lambda: sorted(descriptors()) == before), before)
+
+    def test_ends_with_its_master(self):
+        server = self.start()
+        self.echo()
+        with self.connect() as connection:
+            connection.sendall(query_request(LIVING, "dawdle", milliseconds=500, nonce="late"))
+            time.sleep(0.2)
+            server.kill()
+            server.wait()
+            self.assertEqual(Reply(self.read_all(connection)).body["data"]["nonce"], "late")
+        self.assertTrue(wait_for(lambda: not self.processes()), self.processes())
+
+
+class Signals(scgi_server.ServerTest):
+    def test_serves_who_waits_before_it_ends(self):
+        server = self.start("--min-workers", "1", "--max-workers", "1")
+        self.echo()
+        connections = [self.connect() for _ in range(5)]
+        for number, connection in enumerate(connections):
+            connection.sendall(query_request(ONCE, "dawdle", milliseconds=100, nonce=f"d{number}"))
+        server.send_signal(signal.SIGTERM)
+        for number, connection in enumerate(connections):
+            with connection:
+                reply = Reply(self.read_all(connection))
+            self.assertEqual(reply.body["data"]["nonce"], f"d{number}")
+        self.assertEqual(server.wait(LONG), 0)
+        self.assertFalse(os.path.exists(self.socket))
+
+    def test_ends_at_once_when_told_twice(self):
+        server = self.start("--min-workers", "1")
+        self.describe(LIVING, deadline=0)
+        self.addCleanup(self.describe, LIVING)
+        with self.connect() as connection:
+            connection.sendall(query_request(LIVING, "hang"))
+            time.sleep(0.3)
+            server.send_signal(signal.SIGTERM)
+            time.sleep(0.3)
+            self.assertIsNone(server.poll())
+            server.send_signal(signal.SIGTERM)
+            self.assertEqual(Reply(self.read_all(connection)).status, 504)
+        self.assertEqual(server.wait(LONG), 0)
+
+    def test_loses_no_request_when_it_loads_anew(self):
+        server = self.start("--max-workers", "4")
+        before = self.echo()["pid"]
+        failures = []
+        ends = time.monotonic() + 1.5
+
+        def client(number):
+            count = 0
+            while time.monotonic() < ends:
+                count += 1
+                try:
+                    self.echo(ONCE if count % 7 == 0 else LIVING, nonce=f"r{number}-{count}")
+                except (OSError, AssertionError) as trouble:
+                    failures.append(repr(trouble))
+
+        clients = [threading.Thread(target=client, args=(number,)) for number in range(4)]
+        for thread in clients:
+            thread.start()
+        for _ in range(10):
+            time.sleep(0.1)
+            server.send_signal(signal.SIGHUP)
+        for thread in clients:
+            thread.join()
+        self.assertEqual(failures, [])
+        self.assertTrue(wait_for(lambda: self.echo()["pid"] != before))
+        self.assertTrue(wait_for(lambda: len(self.children(server.pid)) == 1))
+
+    def test_notices_a_changed_description(self):
+        self.start()
+        self.echo()
+        self.describe(LIVING, methods=["echo"])
+        self.addCleanup(self.describe, LIVING)
+        self.assertTrue(
+            wait_for(lambda: self.ask(LIVING, "dawdle").body.get("error") == {"code": 103})
+        )
+
+    def test_notices_a_replaced_library(self):
+        self.start()
+        self.assertEqual(self.echo()["mark"], "first")
+        library = self.libraries[LIVING]
+        for module, mark in ((scgi_server.OTHER_MODULE, "second"), (scgi_server.MODULE, "first")):
+            with open(module, "rb") as source, open(library + ".new", "wb") as target:
+                target.write(source.read())
+            os.rename(library + ".new", library)
+            self.assertTrue(wait_for(lambda mark=mark: self.echo()["mark"] == mark))
+
+
+class Socket(scgi_server.ServerTest):
+    def run_server(self, *options, **more):
+        return subprocess.run(
+            [SERVER, *options], capture_output=True, timeout=LONG, check=False, **more
+        )
+
+    def test_lets_owner_and_group_connect(self):
+        self.start()
+        self.assertEqual(stat.S_IMODE(os.stat(self.socket).st_mode), 0o660)
+
+    def test_refuses_a_socket_that_is_in_use(self):
+        self.start()
+        result = self.run_server("--socket", self.socket)
+        self.assertEqual(result.returncode, 1)
+        self.assertIn(b"in use", result.stderr)
+        self.echo()
+
+    def test_explains_wrong_usage(self):
+        for options in ((), ("--queue", "x"), ("--nonsense",), ("--socket", "/x", "more")):
+            result = self.run_server(*options)
+            self.assertEqual(result.returncode, 2, options)
+            self.assertIn(b"usage:", result.stderr)
+        self.assertEqual(self.run_server("--help").returncode, 0)
+
+    def test_takes_the_socket_that_systemd_hands_over(self):
+        self.socket = os.path.join(self.folder, "handed-over")
+        with socket.socket(socket.AF_UNIX) as listening:
+            listening.bind(self.socket)
+            listening.listen(16)
+            script = (
+                "import os, sys; os.dup2(int(sys.argv[1]), 3);"
+                "os.environ.update(LISTEN_FDS='1', LISTEN_PID=str(os.getpid()));"
+                "os.execv(sys.argv[2], sys.argv[3:])"
+            )
+            # Its name is the socket's, by which the test finds its processes.
+            server = subprocess.Popen(
+                ["/usr/bin/python3", "-c", script]
+                + [str(listening.fileno()), SERVER, self.socket, "--queue", "5"],
+                pass_fds=(listening.fileno(),),
+            )
+            self.addCleanup(self.stop, server, self.socket)
+            self.echo()
+            server.send_signal(signal.SIGTERM)
+            self.assertEqual(server.wait(LONG), 0)
+            self.assertTrue(os.path.exists(self.socket))
+
+
+class Trouble(scgi_server.ServerTest):
+    def test_gives_no_foreign_answer_whoever_is_killed(self):
+        """Workers, template and master die at random under eight clients."""
+        self.start("--max-workers", "6")
+        self.echo()
+        ends = time.monotonic() + 5
+        foreign = []
+        right = [0]
+
+        def client(number):
+            count = 0
+            while time.monotonic() < ends:
+                count += 1
+                nonce = f"k{number}-{count}"
+                try:
+                    reply = self.ask(ONCE if count % 4 == 0 else LIVING, "echo", nonce=nonce)
+                except OSError:
+                    continue
+                if reply.status == 500 and reply.body["error"] == {"code": 117}:
+                    continue
+                if reply.body.get("data", {}).get("nonce") != nonce:
+                    foreign.append(reply.raw)
+                right[0] += 1
+
+        clients = [threading.Thread(target=client, args=(number,)) for number in range(8)]
+        for thread in clients:
+            thread.start()
+        choice = random.Random(7)
+        round_ = 0
+        while time.monotonic() < ends:
+            time.sleep(0.05)
+            round_ += 1
+            if round_ % 30 == 0:
+                self.server.kill()
+                self.server.wait()
+                self.start("--max-workers", "6", socket_path=self.socket)
+                continue
+            others = [pid for pid in self.processes() if pid != self.server.pid]
+            if others:
+                try:
+                    os.kill(choice.choice(others), signal.SIGKILL)
+                except ProcessLookupError:
+                    pass
+        for thread in clients:
+            thread.join()
+        self.assertEqual(foreign, [])
+        self.assertGreater(right[0], 100)
+        self.echo()
+        self.assertTrue(wait_for(lambda: len(self.processes()) <= 8), self.processes())
+
+
+if __name__ == "__main__":
+    unittest.main()
