@@ -20,6 +20,7 @@ SESSION_DIR = ROOT / "run/talo/session"
 THROTTLE_DIR = ROOT / "run/talo/throttle"
 ACCOUNTS_FILE = ROOT / "etc/talo/accounts"
 HOST_CONF = ROOT / "etc/talo/host.conf"
+TASK_DIR = ROOT / "var/lib/talo/task"
 
 ADDRESS = "192.0.2.1"
 HOST = "nas.local"
@@ -146,6 +147,32 @@ def forget_sessions():
 def forget_accounts():
     for path in (ACCOUNTS_FILE, ACCOUNTS_FILE.with_name("accounts.lock"), HOST_CONF):
         path.unlink(missing_ok=True)
+
+
+def runs_here(process):
+    """Whether a process's program is one of the private root."""
+    try:
+        return os.readlink(process / "exe").startswith(f"{ROOT}/")
+    except OSError:
+        return False
+
+
+def wait_until(condition, seconds=60):
+    """Long, for a busy machine: only a failure takes all of it."""
+    deadline = time.monotonic() + seconds
+    while not condition():
+        if time.monotonic() > deadline:
+            return False
+        time.sleep(0.02)
+    return True
+
+
+def forget_tasks():
+    """Takes the store away when nobody has it open any more: whoever closes the last
+    connection to a store takes away a log of that name, which may be the next one's."""
+    processes = pathlib.Path("/proc")
+    assert wait_until(lambda: not any(map(runs_here, processes.glob("[0-9]*")))), "a task runs"
+    shutil.rmtree(TASK_DIR, ignore_errors=True)
 
 
 def session_ids():

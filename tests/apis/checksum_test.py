@@ -7,13 +7,11 @@ import pathlib
 import shutil
 import subprocess
 import tempfile
-import time
 import unittest
 
-from appliance import ROOT, ApplianceTest, call
+from appliance import ROOT, ApplianceTest, call, forget_tasks, wait_until
 
 SHARES_FILE = ROOT / "etc/talo/shares"
-TASK_DIR = ROOT / "var/lib/talo/task"
 
 
 def sha256(content):
@@ -34,7 +32,7 @@ class ChecksumTest(ApplianceTest):
         self.folder = pathlib.Path(tempfile.mkdtemp(dir=ROOT))
         self.addCleanup(shutil.rmtree, self.folder, ignore_errors=True)
         self.addCleanup(SHARES_FILE.unlink, missing_ok=True)
-        self.addCleanup(shutil.rmtree, TASK_DIR, ignore_errors=True)
+        self.addCleanup(forget_tasks)
         SHARES_FILE.write_text(json.dumps(
             {"name": "data", "folder": str(self.folder), "readers": ["normal"]}) + "\n",
             encoding="utf-8")
@@ -57,14 +55,12 @@ class ChecksumTest(ApplianceTest):
     def task(self, method, task_id, sid=None, **parameters):
         return call("TALO.Task", method, 1, sid or self.sid, task_id=task_id, **parameters)
 
-    def finished(self, task_id, seconds=20):
-        deadline = time.monotonic() + seconds
-        while True:
-            status = self.task("status", task_id).data
-            if status["finish"]:
-                return status
-            self.assertLess(time.monotonic(), deadline, status)
-            time.sleep(0.02)
+    def status(self, task_id):
+        return self.task("status", task_id).data
+
+    def finished(self, task_id):
+        self.assertTrue(wait_until(lambda: self.status(task_id)["finish"]), task_id)
+        return self.status(task_id)
 
     def result(self, **parameters):
         return self.finished(self.start(**parameters).data["task_id"])["data"]
@@ -171,15 +167,10 @@ class Stop(ChecksumTest):
         os.link(self.folder / "endless", self.folder / "tree/b")
         for path in ("/data/endless", "/data/tree"):
             task_id = self.start(path=path).data["task_id"]
-            began = time.monotonic()
             self.assertEqual(self.task("stop", task_id).code, 0)
-            while True:
-                status = self.task("status", task_id).data
-                if not status["success"]:
-                    break
-                # Much more than the second that it may take, for a busy machine.
-                self.assertLess(time.monotonic() - began, 10, status)
-                time.sleep(0.02)
+            # Much more than the second that it may take, for a busy machine.
+            self.assertTrue(wait_until(lambda: not self.status(task_id)["success"], 10))
+            status = self.status(task_id)
             self.assertEqual(status["error"]["code"], 415)
             errors = status["error"]["errors"]
             self.assertEqual((errors["state"], errors["path"]), ("stopped", path))

@@ -8,10 +8,10 @@ import subprocess
 import tempfile
 
 import appliance
-from appliance import ADDRESS, ENTRY_CGI, HOST, PASSED_ON, ROOT, TIMEOUT, ApplianceTest, Reply, call
+from appliance import (ADDRESS, ENTRY_CGI, HOST, PASSED_ON, ROOT, TIMEOUT, ApplianceTest, Reply, call,
+                       forget_tasks)
 
 SHARES_FILE = ROOT / "etc/talo/shares"
-TASK_DIR = ROOT / "var/lib/talo/task"
 BOUNDARY = "a-boundary"
 
 
@@ -73,7 +73,7 @@ class FileTest(ApplianceTest):
         self.top = pathlib.Path(tempfile.mkdtemp(dir=ROOT))
         self.addCleanup(shutil.rmtree, self.top, ignore_errors=True)
         self.addCleanup(SHARES_FILE.unlink, missing_ok=True)
-        self.addCleanup(shutil.rmtree, TASK_DIR, ignore_errors=True)
+        self.addCleanup(forget_tasks)
         self.folder = self.top / "data"
         self.folder.mkdir()
         (self.top / "closed").mkdir()

@@ -3,11 +3,10 @@
 import os
 import pathlib
 import subprocess
-import time
 import unittest
 
 import appliance
-from appliance import ENTRY_CGI, TIMEOUT, Reply, call
+from appliance import ENTRY_CGI, TIMEOUT, Reply, call, wait_until
 from file_case import environment, run, upload, Answer, download, FileTest, METHODS
 
 
@@ -227,13 +226,12 @@ class Remove(FileTest):
         (self.folder / "tree/out").symlink_to(self.top / "closed")
         task_id = self.file("remove", path="/data/tree").data["task_id"]
         self.assertRegex(task_id, r"\Anormal/remove-")
-        deadline = time.monotonic() + 20
-        while True:
-            status = call("TALO.Task", "status", 1, self.sid, task_id=task_id).data
-            if status["finish"] or time.monotonic() > deadline:
-                break
-            time.sleep(0.02)
-        self.assertEqual(status["data"], {"state": "done", "removed": 57})
+
+        def status():
+            return call("TALO.Task", "status", 1, self.sid, task_id=task_id).data
+
+        self.assertTrue(wait_until(lambda: status()["finish"]))
+        self.assertEqual(status()["data"], {"state": "done", "removed": 57})
         self.assertEqual(self.names(), [])
         self.assertTrue((self.top / "closed/file").exists())
 

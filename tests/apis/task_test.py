@@ -3,16 +3,15 @@
 import json
 import os
 import pathlib
-import shutil
 import signal
 import sqlite3
 import time
 import unittest
 
 import appliance
-from appliance import ApplianceTest, call, form, last_use, leave_unused, post, session
+from appliance import (TASK_DIR, ApplianceTest, call, forget_tasks, form, last_use, leave_unused,
+                       post, session, wait_until)
 
-TASK_DIR = appliance.ROOT / "var/lib/talo/task"
 HERE = pathlib.Path(__file__).resolve().parent
 DESCRIPTION = json.loads((HERE.parent / "e2e/Test.Task.lib").read_text(encoding="utf-8"))
 METHODS = ("status", "progress", "stop", "list")
@@ -22,10 +21,6 @@ def task(method, cookie=None, variables=None, **parameters):
     return call("TALO.Task", method, 1, cookie, variables, **parameters)
 
 
-def forget_tasks():
-    shutil.rmtree(TASK_DIR, ignore_errors=True)
-
-
 def lives(pid):
     """Whether there is such a process, and not just what its parent has yet to ask for."""
     try:
@@ -33,15 +28,6 @@ def lives(pid):
     except OSError:
         return False
     return state.rpartition(")")[2].split()[0] not in "ZX"
-
-
-def wait_until(condition, seconds=20):
-    deadline = time.monotonic() + seconds
-    while not condition():
-        if time.monotonic() > deadline:
-            return False
-        time.sleep(0.02)
-    return True
 
 
 class TaskTest(ApplianceTest):
