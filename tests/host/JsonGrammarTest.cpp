@@ -2,8 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <exception>
 #include <memory>
 #include <string>
+#include <thread>
 
 namespace {
 
@@ -257,6 +259,27 @@ TEST(JsonGrammar, LooksAtNothingBehindTheEnd) {
     host::JsonError error;
     EXPECT_TRUE(host::ParseJson(text.data(), text.data() + 3, kDepth, &value, &error));
     EXPECT_TRUE(host::AcceptJson(text.data() + 1, text.data() + 2, kDepth, &error));
+}
+
+// A background task's progress is written beside its result.
+TEST(JsonGrammar, ReadsInTwoThreadsAtOnce) {
+    const std::string text = R"({"list":[1,{"a":"b"},[[]],{}],"text":"x","more":{"n":{"m":1}}})";
+    const auto read = [&](int* wrong) {
+        for (int round = 0; round < 5000; ++round) {
+            Json::Value value;
+            host::JsonError error;
+            try {
+                *wrong += Parse(text, &value, &error) && value["more"]["n"]["m"] == 1 ? 0 : 1;
+            } catch (const std::exception&) {
+                ++*wrong;
+            }
+        }
+    };
+    int wrong[2] = {};
+    std::thread other(read, &wrong[0]);
+    read(&wrong[1]);
+    other.join();
+    EXPECT_EQ(wrong[0] + wrong[1], 0);
 }
 
 }  // namespace

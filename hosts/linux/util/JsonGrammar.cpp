@@ -245,9 +245,10 @@ class Walk {
     bool object_[kSlots] = {};
 };
 
-// Built once: making a reader costs more than reading a short value.
+// Built once: making a reader costs more than reading a short value. For each thread,
+// since a reader keeps where it is in itself.
 Json::CharReader& Reader() {
-    static const std::unique_ptr<Json::CharReader> reader([] {
+    static thread_local const std::unique_ptr<Json::CharReader> reader([] {
         Json::CharReaderBuilder builder;
         Json::CharReaderBuilder::strictMode(&builder.settings_);
         builder["strictRoot"] = false;
