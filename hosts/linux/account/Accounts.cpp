@@ -6,6 +6,7 @@
 #include "hosts/linux/account/Backend.h"
 #include "hosts/linux/account/SystemAccounts.h"
 #include "hosts/linux/conf/KeyValueFile.h"
+#include "hosts/linux/util/FileState.h"
 #include "platform/Paths.h"
 
 namespace host {
@@ -21,10 +22,20 @@ Lookup FindAccountOf(const std::string& name, talo::Account* account) {
     if (UsesSystemAccounts()) {
         return FindInSystem(name, account);
     }
+    // A request asks for its user several times. What is kept has no password.
+    static thread_local KeptFromFile<std::string, talo::Account> last;
+    const FileState now(TALO_ACCOUNTS_FILE);
+    if (const talo::Account* kept = last.Find(name, now)) {
+        *account = *kept;
+        return Lookup::kFound;
+    }
     StoredAccount stored;
     const Lookup found = FindInFile(TALO_ACCOUNTS_FILE, name, &stored);
     if (found == Lookup::kFound) {
         *account = std::move(stored.account);
+        if (now.IsSettled()) {
+            last.Keep(name, now, *account);
+        }
     }
     return found;
 }

@@ -32,7 +32,7 @@ int Prepare(const char* prefix, TALOCGI* ctx) {
     ctx->state->prefix = prefix != nullptr ? prefix : "";
     ctx->defaultTimeout = TLIBCConfGetORBTimeout();
     ctx->skipIPCheck = host::HostSetting("skip_ip_check", "no") == "yes" ? 1 : 0;
-    const std::string dir = host::SessionDir();
+    const std::string dir = host::FindSessionDir();
     if (dir.size() >= sizeof ctx->sessionDir) {
         return -1;
     }

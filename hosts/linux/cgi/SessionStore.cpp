@@ -16,6 +16,7 @@
 
 #include "hosts/linux/cgi/SessionRecord.h"
 #include "hosts/linux/util/Descriptor.h"
+#include "hosts/linux/util/FileState.h"
 #include "hosts/linux/util/HostLog.h"
 #include "hosts/linux/util/SmallFile.h"
 #include "platform/Paths.h"
@@ -65,12 +66,16 @@ std::string PathOf(const std::string& id) {
     return SessionDir() + "/" + id;
 }
 
+// The session read last: a request looks at its own several times. A record is
+// never written again, another one would be another file.
+KeptFromFile<std::string, talo::Session>& LastSession() {
+    static thread_local KeptFromFile<std::string, talo::Session> last;
+    return last;
+}
+
 // O_NOFOLLOW, and the owner: a file that somebody else put there is no session.
-bool ReadSession(const std::string& id, talo::Session* session) {
-    if (!talo::IsSessionId(id)) {
-        return false;
-    }
-    const Descriptor file(open(PathOf(id).c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
+bool ReadSessionFile(const std::string& path, talo::Session* session) {
+    const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK));
     struct stat facts = {};
     if (file.Get() < 0 || fstat(file.Get(), &facts) != 0 || facts.st_uid != geteuid()) {
         return false;
@@ -86,6 +91,30 @@ bool ReadSession(const std::string& id, talo::Session* session) {
     read.lastUse = facts.st_mtime;
     *session = read;
     return true;
+}
+
+bool ReadSession(const std::string& id, talo::Session* session) {
+    if (!talo::IsSessionId(id)) {
+        return false;
+    }
+    const std::string path = PathOf(id);
+    const FileState now(path);
+    if (const talo::Session* last = LastSession().Find(id, now)) {
+        *session = *last;
+        return true;
+    }
+    if (!ReadSessionFile(path, session)) {
+        return false;
+    }
+    LastSession().Keep(id, now, *session);
+    return true;
+}
+
+// To resolve the place costs a call per folder of its path, so the name found is
+// kept. "" when there is none yet.
+std::string& FoundDir() {
+    static std::string found;
+    return found;
 }
 
 // Whether a name that was found earlier still is the place, without links. Where
@@ -126,10 +155,8 @@ void RemoveLeftover(const std::string& name, long long now) {
 
 }  // namespace
 
-// To resolve the place costs a call per folder of its path, so it is kept as
-// long as the name found still leads to the same folder.
-std::string SessionDir() {
-    static std::string found;
+std::string FindSessionDir() {
+    std::string& found = FoundDir();
     const std::string dir = TALO_SESSION_DIR;
     if (!found.empty() && IsSameFolder(dir.c_str(), found.c_str())) {
         return found;
@@ -140,6 +167,11 @@ std::string SessionDir() {
     }
     found = resolved != nullptr ? resolved.get() : "";
     return resolved != nullptr ? found : dir;
+}
+
+std::string SessionDir() {
+    const std::string& found = FoundDir();
+    return found.empty() ? FindSessionDir() : found;
 }
 
 bool HasTimedOut(const talo::Session& session, int defaultMinutes, long long now) {
@@ -179,6 +211,7 @@ bool CreateSession(const Session& session, std::string* id) {
     record.handle = host::RandomName(host::kHandleLetter, host::kHandleBytes);
     record.created = time(nullptr);
     const std::string fresh = host::RandomName(host::kIdLetter, host::kIdBytes);
+    (void)host::FindSessionDir();
     if (fresh.empty() || record.handle.empty() ||
         !host::ReplaceFile(host::PathOf(fresh), host::FormatSessionRecord(record))) {
         using host::kSource;
@@ -193,10 +226,18 @@ bool FindSession(const std::string& id, Session* session) {
     return host::ReadSession(id, session);
 }
 
-// Read first: touching follows links and takes folders.
+// Read first: touching follows links and takes folders. Only the time is another
+// afterwards.
 bool RenewSession(const std::string& id) {
     Session session;
-    return host::ReadSession(id, &session) && TLIBCFileUTime(host::PathOf(id).c_str(), 1, 0) >= 0;
+    const std::string path = host::PathOf(id);
+    if (!host::ReadSession(id, &session) || TLIBCFileUTime(path.c_str(), 1, 0) < 0) {
+        return false;
+    }
+    const host::FileState now(path);
+    session.lastUse = now.Facts().st_mtime;
+    host::LastSession().Keep(id, now, session);
+    return true;
 }
 
 bool EndSession(const std::string& id) {

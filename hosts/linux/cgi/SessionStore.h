@@ -8,7 +8,9 @@
 namespace host {
 
 // The folder of the session files, without links in its path; it is made when
-// it is missing.
+// it is missing. Every request looks for it anew when it begins, and takes the
+// one found from then on.
+std::string FindSessionDir();
 std::string SessionDir();
 
 // Whether the session has gone unused for longer than it may: its own minutes, or

@@ -1,8 +1,11 @@
 #include "hosts/linux/conf/KeyValueFile.h"
 
+#include <time.h>
+
 #include <charconv>
 
 #include "hosts/linux/conf/KeyValueText.h"
+#include "hosts/linux/util/FileState.h"
 #include "hosts/linux/util/SmallFile.h"
 #include "platform/Paths.h"
 
@@ -33,8 +36,45 @@ bool FileHasKeyValue(const char* path, const std::string& key, const std::string
     return ReadContent(path, &content) && HasKeyValue(content, key, value);
 }
 
+namespace {
+
+// The configuration as it was read last, by this thread.
+class KeptSettings {
+  public:
+    // A request asks for settings a dozen times within a millisecond: the file is
+    // looked at for the first of them, and read when it has changed.
+    const std::string& Content() {
+        struct timespec now = {};
+        (void)clock_gettime(CLOCK_MONOTONIC_COARSE, &now);
+        if (!isSettled_ || now.tv_sec != looked_.tv_sec || now.tv_nsec != looked_.tv_nsec) {
+            Look();
+            looked_ = now;
+        }
+        return content_;
+    }
+
+  private:
+    void Look() {
+        const FileState state(TALO_HOST_CONF);
+        if (isSettled_ && state == state_) {
+            return;
+        }
+        content_.clear();
+        isSettled_ = state.IsKnown() && ReadContent(TALO_HOST_CONF, &content_) && state.IsSettled();
+        state_ = state;
+    }
+
+    struct timespec looked_ = {};  // in steps of some milliseconds
+    bool isSettled_ = false;
+    FileState state_;
+    std::string content_;
+};
+
+}  // namespace
+
 HostSettings::HostSettings() {
-    (void)ReadContent(TALO_HOST_CONF, &content_);
+    static thread_local KeptSettings kept;
+    content_ = kept.Content();
 }
 
 std::string HostSettings::Text(const std::string& key, const std::string& fallback) const {
