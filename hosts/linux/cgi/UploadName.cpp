@@ -34,10 +34,12 @@ bool IsRandomText(const std::string& text) {
 
 }  // namespace
 
-// Field 22 of the line; the second one, the program's name, may hold anything,
-// blanks and parentheses too.
+// Fields 20, 22 and 23 of the line; the second one, the program's name, may hold
+// anything, blanks and parentheses too.
 unsigned long long ProcessStart(pid_t pid) {
-    constexpr int kFieldsBehindName = 20;
+    constexpr int kThreads = 18;  // counted from the name
+    constexpr int kStart = 20;
+    constexpr int kMemory = 21;
     const std::string path = "/proc/" + std::to_string(pid) + "/stat";
     const Descriptor file(open(path.c_str(), O_RDONLY | O_CLOEXEC));
     char buffer[1024];
@@ -46,15 +48,16 @@ unsigned long long ProcessStart(pid_t pid) {
         return 0;
     }
     const std::string line(buffer, static_cast<size_t>(got));
+    unsigned long long numbers[kMemory + 1] = {};
     size_t at = line.rfind(')');
-    for (int field = 0; field < kFieldsBehindName && at != std::string::npos; ++field) {
+    for (int field = 0; field <= kMemory && at != std::string::npos; ++field) {
+        (void)ReadNumber(line.substr(at + 1, line.find(' ', at + 1) - at - 1), &numbers[field]);
         at = line.find(' ', at + 1);
     }
-    unsigned long long start = 0;
-    if (at != std::string::npos) {
-        (void)ReadNumber(line.substr(at + 1, line.find(' ', at + 1) - at - 1), &start);
-    }
-    return start;
+    // Who was killed has given its memory back long before its parent hears of it;
+    // a first thread that leaves the others behind has, too.
+    const bool hasEnded = numbers[kMemory] == 0 && numbers[kThreads] <= 1;
+    return hasEnded ? 0 : numbers[kStart];
 }
 
 std::string NewUploadName() {

@@ -20,7 +20,8 @@ std::string NewUploadName();
 // The process of such a name. False, and the outputs untouched, for other names.
 bool ParseUploadName(const std::string& name, pid_t* pid, unsigned long long* start);
 
-// When a process started, 0 when there is none or it cannot be told.
+// When a process started, 0 when there is none, also none but its remains that its
+// parent has not seen yet, or it cannot be told.
 unsigned long long ProcessStart(pid_t pid);
 
 }  // namespace host

@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <signal.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -10,6 +11,7 @@
 #include <ctime>
 #include <filesystem>
 #include <string>
+#include <thread>
 
 #include "hosts/linux/cgi/UploadName.h"
 #include "tests/host/upload/UploadFixture.h"
@@ -19,6 +21,40 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr long kMinute = 60;
+
+// A child process that, once it has ended, is nothing but remains until this goes.
+class Ending {
+  public:
+    explicit Ending(void (*work)() = [] { (void)pause(); })
+        : process_(fork()), start_(host::ProcessStart(process_)) {
+        if (process_ == 0) {
+            work();
+            _exit(0);
+        }
+    }
+    ~Ending() {
+        (void)kill(process_, SIGKILL);
+        (void)waitpid(process_, nullptr, 0);
+    }
+    Ending(const Ending&) = delete;
+    Ending& operator=(const Ending&) = delete;
+
+    pid_t Process() const {
+        return process_;
+    }
+    unsigned long long Start() const {
+        return start_;
+    }
+    void End() const {
+        (void)kill(process_, SIGKILL);
+        siginfo_t facts = {};
+        (void)waitid(P_PID, static_cast<id_t>(process_), &facts, WEXITED | WNOWAIT);
+    }
+
+  private:
+    pid_t process_;
+    unsigned long long start_;
+};
 
 class UploadSweep : public ::testing::Test {
   protected:
@@ -92,6 +128,15 @@ TEST_F(UploadSweep, LeavesWhatALivingProcessHas) {
     EXPECT_FALSE(IsThere(reused));
 }
 
+TEST_F(UploadSweep, TakesAProcessThatItsParentHasNotSeenEndForGone) {
+    const Ending child;
+    const std::string name = Name(child.Process(), child.Start());
+    Make(name, 2 * host::kAbandonedSeconds);
+    child.End();
+    Sweep();
+    EXPECT_FALSE(IsThere(name));
+}
+
 TEST_F(UploadSweep, LeavesWhatIsNoUpload) {
     const std::string name = Abandoned();
     const std::string others[] = {"webapi-upload-",
@@ -132,6 +177,26 @@ TEST_F(UploadSweep, IsNotLedAstrayByItsMark) {
     EXPECT_LT(fs::last_write_time(Path("victim")),
               fs::file_time_type::clock::now() - std::chrono::hours(24));
     host::SweepUploads(Path("absent"));
+}
+
+TEST(UploadName, TellsNoStartOfAProcessThatHasEnded) {
+    const Ending child;
+    EXPECT_NE(child.Start(), 0u);
+    EXPECT_EQ(host::ProcessStart(child.Process()), child.Start());
+    child.End();
+    EXPECT_EQ(host::ProcessStart(child.Process()), 0u);
+}
+
+TEST(UploadName, TellsTheStartOfAProcessWhoseFirstThreadHasEnded) {
+    const Ending child([] {
+        std::thread([] { (void)pause(); }).detach();
+        (void)syscall(SYS_exit, 0);  // of this thread alone
+    });
+    const unsigned long long start = child.Start();
+    for (int look = 0; look < 100; ++look) {
+        ASSERT_EQ(host::ProcessStart(child.Process()), start);
+        (void)usleep(1000);
+    }
 }
 
 TEST(UploadName, TellsItsProcess) {
