@@ -1,8 +1,27 @@
 #include "webapi/APIBase.h"
 
+#include <algorithm>
+
 #include "src/base/JsonConvert.h"
 
 namespace TALO {
+
+namespace {
+
+void KeepStrings(Json::Value* members) {
+    for (const std::string& name : members->getMemberNames()) {
+        if (!(*members)[name].isString()) {
+            members->removeMember(name);
+        }
+    }
+}
+
+bool AreStrings(const Json::Value& members) {
+    return std::all_of(members.begin(), members.end(),
+                       [](const Json::Value& member) { return member.isString(); });
+}
+
+}  // namespace
 
 APIBase::APIBase() : store(Json::objectValue) {}
 
@@ -20,14 +39,18 @@ bool APIBase::SetData(const std::string& section, const Json::Value& members, bo
     if (!target.isObject()) {
         return false;
     }
-    // Merged aside: `members` may be a part of what the merge replaces.
-    Json::Value merged = target;
-    for (auto member = members.begin(); member != members.end(); ++member) {
-        if (!stringOnly || member->isString()) {
-            merged[member.name()] = *member;
-        }
+    // Copied first: `members` may be a part of what it replaces.
+    Json::Value taken(members);
+    if (stringOnly && !AreStrings(taken)) {
+        KeepStrings(&taken);
     }
-    target.swap(merged);
+    if (target.empty()) {
+        target.swap(taken);
+        return true;
+    }
+    for (auto member = taken.begin(); member != taken.end(); ++member) {
+        target[member.name()].swap(*member);
+    }
     return true;
 }
 
