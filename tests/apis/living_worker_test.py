@@ -17,7 +17,7 @@ import unittest
 import appliance
 import file_case
 import relay_test
-from appliance import WEBAPI_DIR, Reply, element
+from appliance import WEBAPI_DIR, Reply, element, wait_until
 
 ROUNDS = int(os.environ["WEBAPI_ROUNDS"])
 SANITIZED = os.environ["WEBAPI_SANITIZED"] == "1"
@@ -71,14 +71,29 @@ class Worker:
         return (int(sizes[1]) - int(sizes[2])) * os.sysconf("SC_PAGE_SIZE")
 
     def descriptors(self):
-        folder = f"/proc/{self.pid}/fd"
-        return sorted(os.readlink(f"{folder}/{name}") for name in os.listdir(folder))
+        """Of the worker at rest: it has answered before it has put itself back."""
+        seen = []
+
+        def rests():
+            seen.append(targets(f"/proc/{self.pid}/fd"))
+            return len(seen) > 1 and seen[-1] == seen[-2] is not None
+
+        assert wait_until(rests)
+        return seen[-1]
 
     def end(self):
         self.process.terminate()
         os.kill(self.pid, 9)
         self.process.wait()
         self.process.stdout.close()
+
+
+def targets(folder):
+    """What the descriptors lead to; None when one is closed meanwhile."""
+    try:
+        return sorted(os.readlink(f"{folder}/{name}") for name in os.listdir(folder))
+    except FileNotFoundError:
+        return None
 
 
 def shipped_methods():
