@@ -22,10 +22,17 @@ configure_and_build() {
 }
 
 # run_tests PRESET [ARGUMENT OF ctest]...: one more at a time than there are
-# processors, because many of them wait.
+# processors, because many of them wait. What failed stands at the very end, where a
+# record that is cut still has it.
 run_tests() {
-    local preset=$1
+    local preset=$1 report status=0
+    report="$(build_folder "$preset")/Testing/tests.xml"
     shift
+    rm -f "$report"
     ctest --test-dir "$(build_folder "$preset")" -j"$(($(nproc) + 1))" --output-on-failure \
-        --no-tests=error "$@"
+        --output-junit "$report" --test-output-truncation head --no-tests=error "$@" || status=$?
+    if [[ $status -ne 0 && -f $report ]]; then
+        python3 "$project/scripts/lib/failed_tests.py" "$report" || true
+    fi
+    return "$status"
 }

@@ -19,8 +19,8 @@ check_address() {
         *) usage_error "no web server '$server': lighttpd, nginx or apache" ;;
     esac
     case $mode in
-        cgi | warm) ;;
-        *) usage_error "no mode '$mode': cgi or warm" ;;
+        warm | cgi) ;;
+        *) usage_error "no mode '$mode': warm or cgi" ;;
     esac
     [[ $port =~ ^[1-9][0-9]{0,4}$ && $port -le 65535 ]] || usage_error "'$port' is no port"
     [[ $bind =~ ^[0-9a-zA-Z.:-]+$ ]] || usage_error "'$bind' is no address"
