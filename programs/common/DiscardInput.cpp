@@ -19,17 +19,18 @@ long MillisecondsNow() {
 
 }  // namespace
 
-void DiscardInput() {
+void DiscardInput(bool ends) {
     const char* const type = getenv("CONTENT_TYPE");
-    const bool isUpload = type != nullptr && strstr(type, "multipart/form-data") != nullptr;
-    const long mostBytes = isUpload ? LONG_MAX : 64L << 20;
-    const long mostMilliseconds = isUpload ? 10000 : 1000;
-    constexpr long kPause = 1000;  // of an upload's client
+    const bool isComing =
+        ends || (type != nullptr && strstr(type, "multipart/form-data") != nullptr);
+    const long mostBytes = isComing ? LONG_MAX : 64L << 20;
+    const long mostMilliseconds = isComing ? 10000 : 1000;
+    constexpr long kPause = 1000;  // of whoever sends
     static char discarded[64 * 1024];
     struct pollfd input = {STDIN_FILENO, POLLIN, 0};
     const long end = MillisecondsNow() + mostMilliseconds;
     long total = 0;
-    for (long left = isUpload ? kPause : 0;
+    for (long left = isComing ? kPause : 0;
          total < mostBytes && left >= 0 && poll(&input, 1, static_cast<int>(left)) > 0;
          left = std::min(kPause, end - MillisecondsNow())) {
         const ssize_t count = read(STDIN_FILENO, discarded, sizeof discarded);

@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <string_view>
-#include <unordered_map>
 
 namespace {
 
@@ -27,6 +26,9 @@ constexpr std::string_view kRefusedNames[] = {
     "HTTP_PROXY", "SCGI", "full_task_id", "task_id", "task_user",
 };
 
+// What the process answers as, also behind a web server that says nothing of it.
+constexpr char kInterface[] = "GATEWAY_INTERFACE=CGI/1.1";
+
 std::string_view NameOf(std::string_view variable) {
     return variable.substr(0, variable.find('='));
 }
@@ -43,6 +45,15 @@ bool IsOfRequests(std::string_view name) {
                [&](std::string_view prefix) { return name.substr(0, prefix.size()) == prefix; });
 }
 
+struct Named {
+    std::string_view name;
+    char* entry;
+
+    bool operator<(const Named& other) const {
+        return name < other.name;
+    }
+};
+
 }  // namespace
 
 Environment::Environment() : before_(environ) {
@@ -58,36 +69,36 @@ Environment::~Environment() {
     environ = before_;
 }
 
-void Environment::Enter(const std::vector<std::string>& variables) {
-    std::vector<std::string> next = variables;
-    request_.swap(next);
+void Environment::Enter(std::vector<std::string> variables) {
+    variables.insert(variables.begin(), kInterface);
+    request_.swap(variables);
     Show();
 }
 
 void Environment::Leave() {
-    Enter({});
+    std::vector<std::string> none;
+    request_.swap(none);
+    Show();
 }
 
 // An element of the result may be of the texts of before: `environ` follows at
 // once, and the old texts go when nobody points to them.
 void Environment::Show() {
-    std::unordered_map<std::string_view, size_t> places;
-    std::vector<char*> entries;
-    entries.reserve(base_.size() + request_.size() + 1);
-    const auto add = [&](std::string* variable) {
-        const auto place = places.emplace(NameOf(*variable), entries.size());
-        if (place.second) {
-            entries.push_back(variable->data());
-        } else {
-            entries[place.first->second] = variable->data();
+    std::vector<Named> named;
+    named.reserve(base_.size() + request_.size());
+    for (std::vector<std::string>* variables : {&base_, &request_}) {
+        for (std::string& variable : *variables) {
+            named.push_back({NameOf(variable), variable.data()});
         }
-    };
-    for (std::string& variable : base_) {
-        add(&variable);
     }
-    for (std::string& variable : request_) {
-        if (!IsAmong(kRefusedNames, NameOf(variable))) {
-            add(&variable);
+    // The last of a name is behind the others of it.
+    std::stable_sort(named.begin(), named.end());
+    std::vector<char*> entries;
+    entries.reserve(named.size() + 1);
+    for (size_t index = 0; index < named.size(); ++index) {
+        const bool isLast = index + 1 == named.size() || named[index].name != named[index + 1].name;
+        if (isLast && !IsAmong(kRefusedNames, named[index].name)) {
+            entries.push_back(named[index].entry);
         }
     }
     entries.push_back(nullptr);

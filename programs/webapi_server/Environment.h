@@ -19,8 +19,9 @@ class Environment {
     Environment(const Environment&) = delete;
     Environment& operator=(const Environment&) = delete;
 
-    // Each is "NAME=value"; of a repeated name the last counts.
-    void Enter(const std::vector<std::string>& variables);
+    // Each is "NAME=value"; of a repeated name the last counts. GATEWAY_INTERFACE is
+    // there even if it is not among them.
+    void Enter(std::vector<std::string> variables);
 
     // Back to what the server was started with, whatever the request has set.
     void Leave();

@@ -22,6 +22,7 @@ constexpr long long kIdleTick = 1000;
 constexpr long long kAcceptPause = 100;
 constexpr long long kMostDraining = 30000;
 constexpr long long kAfterDraining = 2000;
+constexpr int kLookAgain = 2;  // who waits while workers do may begin soon
 constexpr long long kRefusalLogPause = 10000;
 
 int OpenSignals() {
@@ -131,7 +132,8 @@ bool Master::AcceptOne() {
     if (connection >= 0) {
         const Waiting waiting = {connection, 0};
         const bool isNext = queue_.Size() == 0;
-        if (!(isNext && workers_.HandOver(waiting, now_)) && !queue_.Add(waiting)) {
+        if (!(isNext && workers_.HandOver(waiting, now_)) && !queue_.Add(waiting) &&
+            !workers_.HandOverAtOnce(waiting, now_)) {
             Refuse(connection);
         }
         return true;
@@ -232,6 +234,9 @@ void Master::Tick() {
 int Master::MillisecondsToWait() const {
     const bool isQuiet = !workers_.AreBusy() && queue_.Size() == 0 && farewell_.IsEmpty() &&
                          drainUntil_ == 0 && isAccepting_ && templates_.Generation() != 0;
+    if (queue_.Size() > 0 && workers_.HaveIdle()) {
+        return kLookAgain;
+    }
     const long long until = isQuiet ? nextTick_ - kTick + kIdleTick : nextTick_;
     return static_cast<int>(std::clamp(until - now_, 0LL, kIdleTick));
 }

@@ -15,7 +15,7 @@ bool SendMessage(int socket, const void* data, size_t size, int descriptor, int 
 ssize_t ReceiveMessage(int socket, void* data, size_t size, int* descriptor, int flags);
 
 // What the master wants of the template: a worker for the slot. The worker's end
-// of its control socket comes along.
+// of its control socket comes along. Without one, the template is to end.
 struct StartOrder {
     int slot;
     unsigned serial;

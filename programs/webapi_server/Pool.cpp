@@ -7,10 +7,18 @@ namespace {
 // Longer than the pauses of a client that looks again and again.
 constexpr long long kIdleStay = 10000;
 
+// What a request needs that waits for nothing, and something over.
+constexpr long long kNew = 5;
+
+constexpr int kAhead = 2;
+
 }  // namespace
 
-Pool::Pool(int minWorkers, int maxWorkers)
-    : min_(minWorkers), max_(maxWorkers), workers_(2 * static_cast<size_t>(maxWorkers)) {
+Pool::Pool(int minWorkers, int maxWorkers, int atOnce)
+    : min_(minWorkers),
+      max_(maxWorkers),
+      atOnce_(atOnce),
+      workers_(2 * static_cast<size_t>(maxWorkers)) {
     counts_[static_cast<int>(WorkerState::kFree)] = Size();
 }
 
@@ -56,6 +64,16 @@ int Pool::ChooseIdle() const {
         }
     }
     return chosen;
+}
+
+bool Pool::MayBegin(long long now) const {
+    if (Count(WorkerState::kBusy) < atOnce_) {
+        return true;
+    }
+    const auto isNew = [now](const PooledWorker& worker) {
+        return worker.state == WorkerState::kBusy && now - worker.since < kNew;
+    };
+    return std::count_if(workers_.begin(), workers_.end(), isNew) < atOnce_;
 }
 
 int Pool::Find(int index, unsigned serial) const {
@@ -110,6 +128,6 @@ int Pool::Count(WorkerState state, int generation) const {
 }
 
 int Pool::Target(int generation, int waiting) const {
-    const int ahead = std::max(1, waiting);
+    const int ahead = std::max(kAhead, waiting);
     return std::clamp(Count(WorkerState::kBusy, generation) + ahead, min_, max_);
 }

@@ -5,6 +5,8 @@
 
 #include <vector>
 
+#include "programs/webapi_server/Deadline.h"
+
 enum class WorkerState {
     kFree,      // there is none
     kStarting,  // ordered of the template
@@ -31,9 +33,7 @@ struct PooledWorker {
     bool wasIdle = false;
     bool hasStatus = false;
     int status = 0;
-    long long quietSince = 0;  // it shows no request, ms
-    long long progressAt = 0;  // of a transfer, ms
-    unsigned long long transferred = 0;
+    Watch watch;  // over its request
 };
 
 // Who works, and how many should. Knows nothing of processes: it only counts.
@@ -42,7 +42,8 @@ struct PooledWorker {
 // may still have requests to finish.
 class Pool {
   public:
-    Pool(int minWorkers, int maxWorkers);
+    // `atOnce` is how many requests may be new at the same time.
+    Pool(int minWorkers, int maxWorkers, int atOnce);
 
     int Size() const {
         return static_cast<int>(workers_.size());
@@ -63,12 +64,17 @@ class Pool {
     // the most of its memory at hand, and the others can leave. -1 when none is.
     int ChooseIdle() const;
 
+    // Whether one more may begin now. Most requests take less than some milliseconds
+    // of a processor: more of them at once than processors would only take turns, and
+    // throw each other out of its caches. Who takes longer waits for something.
+    bool MayBegin(long long now) const;
+
     // The place of a worker that was not replaced since; -1 when it was.
     int Find(int index, unsigned serial) const;
     int FindProcess(pid_t pid) const;
 
-    // How many more should start while so many requests wait: one is always ready
-    // ahead, below the maximum.
+    // How many more should start while so many requests wait for one: some are always
+    // ready ahead, below the maximum.
     int ToStart(int generation, int waiting) const;
 
     // One that may leave, since there are more than needed and it was idle for long;
@@ -83,6 +89,7 @@ class Pool {
 
     int min_;
     int max_;
+    int atOnce_;
     unsigned serial_ = 0;
     std::vector<PooledWorker> workers_;
     int counts_[kWorkerStates] = {};

@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <grp.h>
 #include <locale.h>
 #include <string.h>
 #include <sys/prctl.h>
@@ -9,7 +10,11 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <charconv>
 #include <cstring>
+#include <fstream>
+#include <iterator>
 
 namespace {
 
@@ -36,10 +41,28 @@ bool IsSame(const sigset_t& one, const sigset_t& other) {
 // The C library adds a flag of its own to what is put back.
 constexpr int kRestorerFlag = 0x04000000;
 
-bool IsSame(const struct sigaction& one, const struct sigaction& other) {
-    return one.sa_sigaction == other.sa_sigaction &&
-           ((one.sa_flags ^ other.sa_flags) & ~kRestorerFlag) == 0 &&
+// Where there is no handler the rest means nothing, but for ended children.
+bool IsSame(int signal, const struct sigaction& one, const struct sigaction& other) {
+    if (one.sa_handler != other.sa_handler) {
+        return false;
+    }
+    if (signal != SIGCHLD && (one.sa_handler == SIG_DFL || one.sa_handler == SIG_IGN)) {
+        return true;
+    }
+    return ((one.sa_flags ^ other.sa_flags) & ~kRestorerFlag) == 0 &&
            IsSame(one.sa_mask, other.sa_mask);
+}
+
+// What the system tells of a set of signals: a digit for four of them.
+bool Holds(std::string_view digits, int signal) {
+    const size_t digit = static_cast<size_t>(signal - 1) / 4 + 1;
+    if (digits.size() < digit) {
+        return false;
+    }
+    unsigned bits = 0;
+    const char* const at = digits.data() + digits.size() - digit;
+    (void)std::from_chars(at, at + 1, bits, 16);
+    return (bits >> ((signal - 1) % 4) & 1u) != 0;
 }
 
 bool IsSame(const struct rlimit& one, const struct rlimit& other) {
@@ -61,9 +84,39 @@ void StopTimers(std::vector<std::string>* changes) {
     }
 }
 
-// Those that still run are background tasks and callbacks.
-void ReapChildren() {
-    while (waitpid(-1, nullptr, WNOHANG) > 0) {
+std::vector<pid_t> Children() {
+    const std::string path = "/proc/self/task/" + std::to_string(gettid()) + "/children";
+    std::ifstream list(path);
+    return std::vector<pid_t>(std::istream_iterator<pid_t>(list), std::istream_iterator<pid_t>());
+}
+
+// Background tasks and callbacks have a session of their own. A callback's process may
+// be so young that it has none yet.
+bool IsDetached(pid_t child) {
+    constexpr int kMostMilliseconds = 100;
+    for (int waited = 0; waited < kMostMilliseconds; ++waited) {
+        const pid_t session = getsid(child);
+        if (session == child || session < 0) {
+            return true;
+        }
+        (void)usleep(1000);
+    }
+    return false;
+}
+
+void EndChildren(std::vector<std::string>* changes) {
+    pid_t ended = 0;
+    while ((ended = waitpid(-1, nullptr, WNOHANG)) > 0) {
+    }
+    if (ended < 0) {
+        return;
+    }
+    for (const pid_t child : Children()) {
+        if (!IsDetached(child)) {
+            (void)kill(child, SIGKILL);
+            (void)waitpid(child, nullptr, 0);
+            changes->emplace_back("a child still runs");
+        }
     }
 }
 
@@ -79,14 +132,14 @@ ProcessState::ProcessState(const std::string& hostFolder)
       limits_(),
       locale_(setlocale(LC_ALL, nullptr)),
       ids_(IdsNow()),
-      threadFolder_(open("/proc/self/task", O_PATH | O_DIRECTORY | O_CLOEXEC)),
-      threads_(Threads()),
+      threads_(0),
       taskName_(),
       programName_(program_invocation_name),
       descriptors_(hostFolder) {
-    for (int number = 1; number < NSIG; ++number) {
-        (void)sigaction(number, nullptr, &actions_[number]);
-    }
+    (void)status_.Read();
+    told_ = Tell();
+    threads_ = status_.Number("Threads");
+    RecordSignals();
     (void)sigprocmask(SIG_SETMASK, nullptr, &blocked_);
     for (int which = 0; which < RLIM_NLIMITS; ++which) {
         (void)getrlimit(static_cast<__rlimit_resource_t>(which), &limits_[which]);
@@ -94,44 +147,68 @@ ProcessState::ProcessState(const std::string& hostFolder)
     (void)prctl(PR_GET_NAME, taskName_);
 }
 
+// The others are as they are when nobody has asked for anything else.
+void ProcessState::RecordSignals() {
+    const std::string_view ignored = status_.Field("SigIgn");
+    const std::string_view caught = status_.Field("SigCgt");
+    for (int number = 1; number < NSIG; ++number) {
+        const bool isCaught = caught.empty() || Holds(caught, number);
+        if (isCaught || number == SIGCHLD || Holds(ignored, number)) {
+            (void)sigaction(number, nullptr, &actions_[number]);
+        }
+        if (isCaught || number == SIGCHLD) {
+            watched_.push_back(number);
+        }
+    }
+}
+
 ProcessState::~ProcessState() {
     if (folder_ >= 0) {
         (void)close(folder_);
     }
-    if (threadFolder_ >= 0) {
-        (void)close(threadFolder_);
-    }
 }
 
-// Each thread is a folder in that one.
-nlink_t ProcessState::Threads() const {
-    struct stat facts = {};
-    (void)fstat(threadFolder_, &facts);
-    return facts.st_nlink;
+ProcessState::Told ProcessState::Tell() const {
+    const auto field = [this](const char* name) { return std::string(status_.Field(name)); };
+    return {field("Umask"), field("Uid") + field("Gid") + field("Groups"), field("SigBlk"),
+            field("SigIgn") + field("SigCgt")};
 }
 
+long long ProcessState::PrivateKiB() const {
+    return status_.Number("RssAnon");
+}
+
+// What the system tells as before is as before; the rest is looked at one by one.
 std::vector<std::string> ProcessState::Restore() {
     std::vector<std::string> changes;
+    (void)status_.Read();
+    const Told now = Tell();
     StopTimers(&changes);
-    RestoreSignals(&changes);
+    RestoreSignals(now, &changes);
+    if (now.blocked.empty() || now.blocked != told_.blocked) {
+        RestoreBlocked(&changes);
+    }
     // Whatever comes next may want a descriptor.
     RestoreLimits(&changes);
     descriptors_.Restore(&changes);
     streams_.Restore(&changes);
     RestoreFolder(&changes);
-    if (FileMask() != mask_) {
-        (void)umask(mask_);
-        changes.emplace_back("the file mode mask is another");
+    if (now.mask.empty() || now.mask != told_.mask) {
+        RestoreMask(&changes);
     }
     if (getpriority(PRIO_PROCESS, 0) != nice_) {
         (void)setpriority(PRIO_PROCESS, 0, nice_);
         changes.emplace_back("the priority is another");
     }
     RestoreLocale(&changes);
-    RestoreIds(&changes);
+    if (now.ids.empty() || now.ids != told_.ids) {
+        RestoreIds(&changes);
+    }
     RestoreName();
-    ReapChildren();
-    if (Threads() > threads_) {
+    EndChildren(&changes);
+    // One that has just been waited for may have been counted still.
+    if (status_.Number("Threads") > threads_ && status_.Read() &&
+        status_.Number("Threads") > threads_) {
         changes.emplace_back("a thread still runs");
     }
     return changes;
@@ -145,16 +222,40 @@ void ProcessState::RestoreFolder(std::vector<std::string>* changes) const {
     }
 }
 
-// The C library keeps two signals to itself: of those nothing is known, then and
-// now.
-void ProcessState::RestoreSignals(std::vector<std::string>* changes) const {
-    for (int number = 1; number < NSIG; ++number) {
-        struct sigaction action = {};
-        if (sigaction(number, nullptr, &action) == 0 && !IsSame(action, actions_[number])) {
-            (void)sigaction(number, &actions_[number], nullptr);
-            changes->push_back("signal " + std::to_string(number) + " is handled otherwise");
-        }
+void ProcessState::RestoreMask(std::vector<std::string>* changes) const {
+    if (FileMask() != mask_) {
+        (void)umask(mask_);
+        changes->emplace_back("the file mode mask is another");
     }
+}
+
+void ProcessState::RestoreSignal(int number, std::vector<std::string>* changes) const {
+    struct sigaction action = {};
+    if (sigaction(number, nullptr, &action) == 0 && !IsSame(number, action, actions_[number])) {
+        (void)sigaction(number, &actions_[number], nullptr);
+        changes->push_back("signal " + std::to_string(number) + " is handled otherwise");
+    }
+}
+
+// The system tells which signals are ignored and which have a handler, not what the
+// handler is, nor what else is to happen when a child ends. The C library keeps two
+// signals to itself: of those nothing is known, then and now.
+void ProcessState::RestoreSignals(const Told& now, std::vector<std::string>* changes) {
+    if (!now.actions.empty() && now.actions == told_.actions) {
+        for (const int number : watched_) {
+            RestoreSignal(number, changes);
+        }
+        return;
+    }
+    for (int number = 1; number < NSIG; ++number) {
+        RestoreSignal(number, changes);
+    }
+    if (status_.Read()) {
+        told_.actions = Tell().actions;
+    }
+}
+
+void ProcessState::RestoreBlocked(std::vector<std::string>* changes) const {
     sigset_t blocked;
     (void)sigemptyset(&blocked);
     (void)sigprocmask(SIG_SETMASK, &blocked_, &blocked);
@@ -191,21 +292,31 @@ void ProcessState::RestoreLocale(std::vector<std::string>* changes) const {
     }
 }
 
+bool ProcessState::Ids::operator==(const Ids& other) const {
+    return std::equal(user, user + 3, other.user) && std::equal(group, group + 3, other.group) &&
+           more == other.more;
+}
+
 ProcessState::Ids ProcessState::IdsNow() {
     Ids ids = {};
     (void)getresuid(&ids.user[0], &ids.user[1], &ids.user[2]);
     (void)getresgid(&ids.group[0], &ids.group[1], &ids.group[2]);
+    const int count = getgroups(0, nullptr);
+    ids.more.resize(count > 0 ? static_cast<size_t>(count) : 0);
+    const int filled = getgroups(static_cast<int>(ids.more.size()), ids.more.data());
+    ids.more.resize(filled > 0 ? static_cast<size_t>(filled) : 0);
     return ids;
 }
 
 void ProcessState::RestoreIds(std::vector<std::string>* changes) const {
     const Ids now = IdsNow();
-    if (std::memcmp(&now, &ids_, sizeof now) == 0) {
+    if (now == ids_) {
         return;
     }
-    // The user's comes first: without it there is no right to the group's.
+    // The user's comes first: without it there is no right to the groups'.
     const bool back = setresuid(ids_.user[0], ids_.user[1], ids_.user[2]) == 0 &&
-                      setresgid(ids_.group[0], ids_.group[1], ids_.group[2]) == 0;
+                      setresgid(ids_.group[0], ids_.group[1], ids_.group[2]) == 0 &&
+                      setgroups(ids_.more.size(), ids_.more.data()) == 0;
     changes->emplace_back(back ? "the user or group is another"
                                : "the user or group is another, for good");
 }

@@ -12,6 +12,7 @@
 
 #include "programs/webapi_server/RestoreDescriptors.h"
 #include "programs/webapi_server/RestoreStreams.h"
+#include "programs/webapi_server/Status.h"
 
 // What a process is while it serves nobody, recorded when its life begins and put
 // back after each request, but for its environment (Environment.h). One in a
@@ -31,9 +32,26 @@ class ProcessState {
     // ended, the rest of a body.
     std::vector<std::string> Restore();
 
+    // Memory that is no file's, as it was at the end of the last Restore, what was
+    // there before a fork included. -1 when the system does not tell.
+    long long PrivateKiB() const;
+
   private:
+    // As the system writes them.
+    struct Told {
+        std::string mask;
+        std::string ids;
+        std::string blocked;
+        std::string actions;
+    };
+
+    Told Tell() const;
+    void RecordSignals();
     void RestoreFolder(std::vector<std::string>* changes) const;
-    void RestoreSignals(std::vector<std::string>* changes) const;
+    void RestoreMask(std::vector<std::string>* changes) const;
+    void RestoreSignal(int number, std::vector<std::string>* changes) const;
+    void RestoreSignals(const Told& now, std::vector<std::string>* changes);
+    void RestoreBlocked(std::vector<std::string>* changes) const;
     void RestoreLimits(std::vector<std::string>* changes) const;
     void RestoreLocale(std::vector<std::string>* changes) const;
     void RestoreIds(std::vector<std::string>* changes) const;
@@ -42,9 +60,11 @@ class ProcessState {
     struct Ids {
         uid_t user[3];
         gid_t group[3];
+        std::vector<gid_t> more;
+
+        bool operator==(const Ids& other) const;
     };
     static Ids IdsNow();
-    nlink_t Threads() const;
 
     int folder_;
     struct stat folderFacts_;
@@ -56,8 +76,10 @@ class ProcessState {
     std::string locale_;
     std::locale streamLocale_;
     Ids ids_;
-    int threadFolder_;
-    nlink_t threads_;
+    ProcessStatus status_;
+    Told told_;
+    long long threads_;
+    std::vector<int> watched_;
     char taskName_[17];
     std::string programName_;
     RestoreStreams streams_;

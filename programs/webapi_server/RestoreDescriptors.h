@@ -26,6 +26,7 @@ class RestoreDescriptors {
         ino_t number;
     };
 
+    bool Record(int number);
     bool IsAsBefore(int descriptor, const Identity& before) const;
     // 0 where the system does not count them.
     long long Count() const;

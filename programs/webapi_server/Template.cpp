@@ -20,6 +20,7 @@
 #include "programs/webapi_server/Changes.h"
 #include "programs/webapi_server/Clock.h"
 #include "programs/webapi_server/Message.h"
+#include "programs/webapi_server/Orphans.h"
 #include "programs/webapi_server/Worker.h"
 #include "webapi/APIRunner.h"
 
@@ -27,6 +28,8 @@ namespace {
 
 constexpr int kControl = 3;
 constexpr int kLookMilliseconds = 1000;
+// A file that was written just before cannot be kept in memory at first.
+constexpr int kSettleMilliseconds = 2500;
 
 // Of the connections and sockets that the master had at the fork, the template
 // keeps none.
@@ -59,10 +62,15 @@ void LoadLibrary(const std::string& path, Changes* changes) {
     changes->AddLibrary(PlaceOf(handle, path));
 }
 
-void Load(bool loadsLibraries, Changes* changes) {
+Json::Value ReadDescriptions() {
     TALO::APIRunner runner;
     Json::Value descriptions(Json::objectValue);
     (void)runner.InitLibDesc(descriptions);
+    return descriptions;
+}
+
+void Load(bool loadsLibraries, Changes* changes) {
+    const Json::Value descriptions = ReadDescriptions();
     for (const Json::Value& description : descriptions) {
         const Json::Value& library = description["lib"];
         if (!library.isString() || library.asString().empty()) {
@@ -78,6 +86,16 @@ void Load(bool loadsLibraries, Changes* changes) {
 
 bool Tell(const TemplateReport& report, int descriptor = -1) {
     return SendMessage(kControl, &report, sizeof report, descriptor, 0);
+}
+
+// Where the master went without reading everything, the system tells of that before
+// it hands out the last order.
+ssize_t ReceiveOrder(StartOrder* order, int* workerControl) {
+    ssize_t got = -1;
+    do {
+        got = ReceiveMessage(kControl, order, sizeof *order, workerControl, 0);
+    } while (got < 0 && errno == ECONNRESET);
+    return got;
 }
 
 struct StartedWorker {
@@ -183,6 +201,7 @@ void RunTemplate(const TemplateTask& task) {
     if (!Tell({Report::kReady, -1, 0, getpid(), 0})) {
         _exit(EXIT_FAILURE);
     }
+    long long settled = MillisecondsNow() + kSettleMilliseconds;
     for (long long nextLook = MillisecondsNow() + kLookMilliseconds;;) {
         struct pollfd waits[] = {{kControl, POLLIN, 0}, {signals, POLLIN, 0}};
         const long long left = nextLook - MillisecondsNow();
@@ -191,6 +210,10 @@ void RunTemplate(const TemplateTask& task) {
             nextLook = MillisecondsNow() + kLookMilliseconds;
             if (changes.Look()) {
                 (void)Tell({Report::kChanged, -1, 0, getpid(), 0});
+            }
+            if (settled != 0 && MillisecondsNow() >= settled) {
+                settled = 0;
+                (void)ReadDescriptions();
             }
         }
         if (waits[1].revents != 0) {
@@ -202,8 +225,13 @@ void RunTemplate(const TemplateTask& task) {
         }
         StartOrder order = {};
         int workerControl = -1;
-        const ssize_t got = ReceiveMessage(kControl, &order, sizeof order, &workerControl, 0);
-        if (got != sizeof order || workerControl < 0 || !nursery.Start(order, workerControl)) {
+        const ssize_t got = ReceiveOrder(&order, &workerControl);
+        if (got == sizeof order && workerControl < 0) {
+            _exit(EXIT_SUCCESS);
+        }
+        if (got != sizeof order || !nursery.Start(order, workerControl)) {
+            // The master is gone: whom it replaces it tells to end.
+            WatchOrphans(*task.slots);
             _exit(EXIT_SUCCESS);
         }
     }

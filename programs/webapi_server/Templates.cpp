@@ -7,9 +7,12 @@
 
 #include <algorithm>
 
+#include "programs/webapi_server/Clock.h"
+
 namespace {
 
 constexpr long long kMostPreparing = 60000;
+constexpr long long kMostPending = 20000;
 constexpr long long kSoundLife = 10000;
 constexpr long long kFirstPause = 100;
 constexpr int kMostDoublings = 7;
@@ -49,7 +52,9 @@ bool Templates::Order(const StartOrder& order, int workerControl) {
         !SendMessage(current->control, &order, sizeof order, workerControl, MSG_DONTWAIT)) {
         return false;
     }
-    ++current->pending;
+    if (current->pending++ == 0) {
+        current->pendingSince = MillisecondsNow();
+    }
     return true;
 }
 
@@ -63,6 +68,13 @@ void Templates::Tick(long long now) {
         syslog(LOG_ERR, "loading takes too long");
         (void)kill(preparing->pid, SIGKILL);
         End(*preparing, now);
+    }
+    for (Handle& handle : all_) {
+        if (handle.pending > 0 && now - handle.pendingSince > kMostPending) {
+            syslog(LOG_ERR, "the template does not start the workers that it is asked for");
+            (void)kill(handle.pid, SIGKILL);
+            End(handle, now);
+        }
     }
 }
 
@@ -104,6 +116,7 @@ void Templates::OnReport(Handle& handle, const TemplateReport& report, int descr
             break;
     }
     --handle.pending;
+    handle.pendingSince = now;
     if (handle.state == State::kRetiring) {
         Retire(handle);
     }
@@ -122,7 +135,8 @@ void Templates::Launch(long long now) {
         RunTemplate({ends[1], &slots_, &settings_, &original_, loadsLibraries});
     }
     (void)close(ends[1]);
-    *handle = {State::kPreparing, pid, ends[0], ++generation_, 0, now, ++serial_, loadsLibraries};
+    *handle = {State::kPreparing, pid,           ends[0], ++generation_, 0, 0, now,
+               ++serial_,         loadsLibraries};
     if (pid < 0 || !poller_.Add(ends[0], {Source::kTemplate, static_cast<int>(handle - all_.data()),
                                           serial_})) {
         syslog(LOG_ERR, "cannot make a template: %m");
@@ -151,6 +165,8 @@ void Templates::BecomeCurrent(Handle& handle, long long now) {
 // on they are the master's own children.
 void Templates::Retire(Handle& handle) {
     if (handle.pending <= 0) {
+        const StartOrder none = {-1, 0};
+        (void)SendMessage(handle.control, &none, sizeof none, -1, MSG_DONTWAIT);
         Drop(handle);
     }
 }

@@ -53,7 +53,8 @@ class Templates {
         pid_t pid = 0;
         int control = -1;
         int generation = 0;
-        int pending = 0;  // orders
+        int pending = 0;             // orders
+        long long pendingSince = 0;  // one was carried out, or the first came
         long long since = 0;
         unsigned serial = 0;
         bool loadsLibraries = true;

@@ -7,6 +7,7 @@
 #include <stdlib.h>
 #include <string.h>
 #include <sys/ioctl.h>
+#include <sys/prctl.h>
 #include <sys/socket.h>
 #include <syslog.h>
 #include <unistd.h>
@@ -15,6 +16,7 @@
 #include <cstdio>
 #include <exception>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "hosts/linux/sdk/Process.h"
@@ -24,7 +26,6 @@
 #include "programs/common/ErrorReply.h"
 #include "programs/webapi_server/Clock.h"
 #include "programs/webapi_server/Environment.h"
-#include "programs/webapi_server/Memory.h"
 #include "programs/webapi_server/Message.h"
 #include "programs/webapi_server/Restore.h"
 #include "programs/webapi_server/Scgi.h"
@@ -49,6 +50,19 @@ void Log(int priority, const std::string& text) {
         line.begin(), line.end(),
         [](char byte) { return static_cast<unsigned char>(byte) < 0x20 || byte == 0x7f; }, '?');
     syslog(priority, "%s", line.c_str());
+}
+
+// Methods, and whoever reads the log, find the program that they know. It takes all
+// of the room, which a request's own name will need.
+void TakeNameOfEntry() {
+    constexpr char kName[] = "entry.cgi";
+    constexpr size_t kSize = sizeof kName - 1;
+    const size_t room = strlen(program_invocation_name);
+    if (room >= kSize) {
+        memset(program_invocation_name, '/', room - kSize);
+        memcpy(program_invocation_name + room - kSize, kName, kSize);
+    }
+    (void)prctl(PR_SET_NAME, kName);
 }
 
 // What the master does about signals is none of a method's business.
@@ -116,7 +130,7 @@ class Worker {
           process_(getpid()),
           end_(MillisecondsNow() + settings.workerSeconds * 1000LL),
           state_(TALO_TASK_DIR) {
-        mostMemory_ = memory_.KiB() + settings.workerGrowthKiB;
+        mostMemory_ = state_.PrivateKiB() + settings.workerGrowthKiB;
     }
 
     void Live() {
@@ -131,7 +145,7 @@ class Worker {
 
     // These answer whether the process may serve another request.
     bool Serve(int connection);
-    bool ServeRead(const std::vector<std::string>& variables);
+    bool ServeRead(std::vector<std::string> variables);
     bool Run();
     bool PutBack();
     bool MayGoOn();
@@ -143,7 +157,6 @@ class Worker {
     const long long end_;
     int served_ = 0;
     Environment environment_;
-    PrivateMemory memory_;
     long long mostMemory_ = 0;
     Nowhere nowhere_;
     ProcessState state_;
@@ -168,6 +181,7 @@ bool Worker::AwaitConnection(int* connection) const {
 }
 
 bool Worker::Serve(int connection) {
+    slot_->pid = process_;
     slot_->answerBegun = 0;
     slot_->transfers = 0;
     std::memset(slot_->api, 0, sizeof slot_->api);
@@ -180,7 +194,7 @@ bool Worker::Serve(int connection) {
         (void)dup2(connection, STDIN_FILENO);
         (void)dup2(connection, STDOUT_FILENO);
         (void)close(connection);
-        return ServeRead(variables);
+        return ServeRead(std::move(variables));
     }
     Log(LOG_WARNING, "a request cannot be read: " + reason);
     if (result != ScgiResult::kGone) {
@@ -195,14 +209,14 @@ bool Worker::Serve(int connection) {
 
 // The reply ends for the web server before the rest of the body is taken: it has
 // no more to say then, and closes its side.
-bool Worker::ServeRead(const std::vector<std::string>& variables) {
-    environment_.Enter(variables);
+bool Worker::ServeRead(std::vector<std::string> variables) {
+    environment_.Enter(std::move(variables));
     EndInputBehindBody();
     BeginCrashReply(&slot_->answerBegun);
     const bool livesOn = Run();
     EndCrashReply();
     (void)shutdown(STDOUT_FILENO, SHUT_WR);
-    DiscardInput();
+    DiscardInput(true);
     (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
     nowhere_.Take();
     const bool back = livesOn && PutBack();
@@ -235,7 +249,7 @@ bool Worker::PutBack() {
 bool Worker::MayGoOn() {
     ++served_;
     return served_ < settings_.workerRequests && MillisecondsNow() < end_ &&
-           memory_.KiB() <= mostMemory_;
+           state_.PrivateKiB() <= mostMemory_;
 }
 
 }  // namespace
@@ -245,6 +259,7 @@ int RunWorker(int control, Slot* slot, const Settings& settings) {
     (void)registered;
     try {
         ResetSignals();
+        TakeNameOfEntry();
         controlInChildren = control;
         slot->pid = getpid();
         TALO::WebEntry::WatchAnswer(&slot->answerBegun);

@@ -1,6 +1,7 @@
 // How workers end: by themselves, past a deadline, or by a fault in what they called.
 
 #include <ctype.h>
+#include <errno.h>
 #include <signal.h>
 #include <string.h>
 #include <sys/socket.h>
@@ -9,16 +10,13 @@
 #include <syslog.h>
 #include <unistd.h>
 
-#include <algorithm>
 #include <utility>
 
 #include "programs/webapi_server/Clock.h"
-#include "programs/webapi_server/Progress.h"
 #include "programs/webapi_server/Workers.h"
 
 namespace {
 
-constexpr long long kMostQuiet = 15000;  // a worker with a request that it has not begun
 constexpr int kMostReturns = 16;
 constexpr long long kMostStarting = 20000;
 constexpr long long kMostLeaving = 5000;
@@ -26,9 +24,13 @@ constexpr long long kStatusComesWithin = 2000;
 
 // Nobody has read of the request yet: it can be served by another worker.
 bool IsUntouched(const Slot& slot, int connection) {
+    if (slot.began != 0 || slot.answerBegun != 0) {
+        return false;
+    }
     char first = 0;
-    return slot.began == 0 && slot.answerBegun == 0 &&
-           recv(connection, &first, 1, MSG_PEEK | MSG_DONTWAIT) == 1 && isdigit(first) != 0;
+    const ssize_t got = recv(connection, &first, 1, MSG_PEEK | MSG_DONTWAIT);
+    // Nothing may have come yet.
+    return got == 1 ? isdigit(first) != 0 : got < 0 && errno == EAGAIN;
 }
 
 }  // namespace
@@ -46,7 +48,8 @@ void Workers::Tick(long long now) {
         const long long inState = now - worker.since;
         switch (worker.state) {
             case WorkerState::kBusy:
-                if (worker.isTimedOut || IsPastDeadline(worker, *slots_.At(index), now)) {
+                if (worker.isTimedOut ||
+                    IsPastDeadline(*slots_.At(index), worker.pid, &worker.watch, now)) {
                     EndInTime(index);
                 }
                 break;
@@ -81,30 +84,6 @@ void Workers::EndInTime(int index) {
                ApiOf(index).c_str(), static_cast<int>(worker.pid));
     }
     Kill(index);
-}
-
-bool Workers::IsPastDeadline(PooledWorker& worker, const Slot& slot, long long now) const {
-    const long long began = slot.began;
-    if (began == 0) {
-        // It reads the request, or puts itself back after it.
-        if (worker.quietSince == 0) {
-            worker.quietSince = now;
-        }
-        return now - worker.quietSince > kMostQuiet;
-    }
-    worker.quietSince = 0;
-    const long long allowed = slot.allowedMs;
-    if (allowed <= 0) {
-        return false;
-    }
-    if (slot.transfers == 1 && now - std::max(began, worker.progressAt) > allowed / 4) {
-        const unsigned long long transferred = TransferredBytes(worker.pid);
-        if (transferred != worker.transferred) {
-            worker.transferred = transferred;
-            worker.progressAt = now;
-        }
-    }
-    return now - std::max(began, worker.progressAt) > allowed;
 }
 
 // At once, and with what it started: it had its time, and a method that hangs may

@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <sys/socket.h>
+#include <sys/sysinfo.h>
 #include <syslog.h>
 #include <unistd.h>
 
@@ -13,6 +14,7 @@ namespace {
 
 constexpr long long kFirstPause = 100;
 constexpr int kMostDoublings = 6;
+constexpr int kAtOncePerProcessor = 2;
 
 }  // namespace
 
@@ -23,7 +25,7 @@ Workers::Workers(const Poller& poller, SlotTable& slots, const Settings& setting
       settings_(settings),
       queue_(queue),
       farewell_(farewell),
-      pool_(settings.minWorkers, settings.maxWorkers) {}
+      pool_(settings.minWorkers, settings.maxWorkers, kAtOncePerProcessor * get_nprocs()) {}
 
 Workers::~Workers() {
     for (int index = 0; index < pool_.Size(); ++index) {
@@ -35,6 +37,10 @@ Workers::~Workers() {
 }
 
 bool Workers::HandOver(const Waiting& waiting, long long now) {
+    return pool_.MayBegin(now) && HandOverAtOnce(waiting, now);
+}
+
+bool Workers::HandOverAtOnce(const Waiting& waiting, long long now) {
     for (int index = pool_.ChooseIdle(); index >= 0; index = pool_.ChooseIdle()) {
         PooledWorker& worker = pool_.At(index);
         slots_.Clear(index);
@@ -43,8 +49,8 @@ bool Workers::HandOver(const Waiting& waiting, long long now) {
                         MSG_DONTWAIT)) {
             worker.connection = waiting.connection;
             worker.returns = waiting.returns;
-            worker.quietSince = now;
-            worker.progressAt = 0;
+            worker.watch.quietSince = now;
+            worker.watch.progressAt = 0;
             worker.isTimedOut = false;
             pool_.SetState(index, WorkerState::kBusy, now);
             return true;
@@ -60,7 +66,9 @@ void Workers::Grow(long long now) {
     if (generation == 0 || now < startNotBefore_) {
         return;
     }
-    for (int count = pool_.ToStart(generation, queue_.Size()); count > 0; --count) {
+    // Who waits only for others to be done needs no worker of its own.
+    const int waiting = pool_.MayBegin(now) ? queue_.Size() : 0;
+    for (int count = pool_.ToStart(generation, waiting); count > 0; --count) {
         if (!Start(generation, now)) {
             return;
         }

@@ -25,8 +25,14 @@ class Workers : public TemplateEvents {
         templates_ = templates;
     }
 
-    // Hands the connection to an idle worker. False when there is none.
+    // Hands the connection to an idle worker. False when there is none, or enough
+    // requests have just begun.
     bool HandOver(const Waiting& waiting, long long now);
+    bool HandOverAtOnce(const Waiting& waiting, long long now);
+
+    bool HaveIdle() const {
+        return pool_.Count(WorkerState::kIdle) > 0;
+    }
 
     // Starts what is wanted while so many requests wait.
     void Grow(long long now);
@@ -64,7 +70,6 @@ class Workers : public TemplateEvents {
     void BecomeIdle(int index, long long now);
     void Dismiss(int index, long long now);
     void DismissOlder(long long now);
-    bool IsPastDeadline(PooledWorker& worker, const Slot& slot, long long now) const;
     void EndInTime(int index);
     void Kill(int index) const;
     void End(int index, long long now);

@@ -9,6 +9,7 @@
 #include <iostream>
 
 #include "programs/webapi_server/Arguments.h"
+#include "programs/webapi_server/Loader.h"
 #include "programs/webapi_server/Master.h"
 
 namespace {
@@ -65,6 +66,7 @@ int Serve(Listener& listener, const Settings& settings) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    BeginWithLoaderSettings(argv);
     Arguments arguments;
     std::string problem;
     if (!ParseArguments(argc, argv, &arguments, &problem)) {

@@ -33,8 +33,8 @@ TEST(ServerArguments, HasADefaultForEverySetting) {
     EXPECT_EQ(outcome.arguments.settings.socket, "");
     EXPECT_EQ(outcome.arguments.settings.minWorkers, 2);
     EXPECT_EQ(outcome.arguments.settings.maxWorkers, 32);
-    EXPECT_EQ(outcome.arguments.settings.queue, 128);
-    EXPECT_EQ(outcome.arguments.settings.deadlineSeconds, 60);
+    EXPECT_EQ(outcome.arguments.settings.queue, 512);
+    EXPECT_EQ(outcome.arguments.settings.deadlineSeconds, 90);
     EXPECT_EQ(outcome.arguments.settings.workerRequests, 10000);
     EXPECT_EQ(outcome.arguments.settings.workerGrowthKiB, 16384);
     EXPECT_EQ(outcome.arguments.settings.workerSeconds, 3600);

@@ -17,7 +17,7 @@ class PoolTest : public testing::Test {
         }
     }
 
-    Pool pool{2, 5};
+    Pool pool{2, 5, 3};
 };
 
 TEST_F(PoolTest, StartsTheMinimum) {
@@ -28,12 +28,28 @@ TEST_F(PoolTest, StartsTheMinimum) {
     EXPECT_EQ(pool.ToStart(kGeneration, 0), 0);
 }
 
-TEST_F(PoolTest, HasOneReadyAheadBelowTheMaximum) {
+TEST_F(PoolTest, HasTwoReadyAheadBelowTheMaximum) {
     Have(2, WorkerState::kBusy);
+    EXPECT_EQ(pool.ToStart(kGeneration, 0), 2);
+    Have(1, WorkerState::kIdle);
     EXPECT_EQ(pool.ToStart(kGeneration, 0), 1);
     Have(1, WorkerState::kBusy);
-    Have(1, WorkerState::kIdle);
+    EXPECT_EQ(pool.ToStart(kGeneration, 0), 1);
+    Have(1, WorkerState::kBusy);
     EXPECT_EQ(pool.ToStart(kGeneration, 0), 0);
+}
+
+TEST_F(PoolTest, LetsNoMoreBeginThanMayBeNewAtTheSameTime) {
+    Have(2, WorkerState::kBusy, 100);
+    Have(5, WorkerState::kIdle, 100);
+    EXPECT_TRUE(pool.MayBegin(100));
+    Have(1, WorkerState::kBusy, 102);
+    EXPECT_FALSE(pool.MayBegin(102));
+    EXPECT_FALSE(pool.MayBegin(104));
+    // The first two wait for something.
+    EXPECT_TRUE(pool.MayBegin(105));
+    pool.SetState(7, WorkerState::kIdle, 102);
+    EXPECT_TRUE(pool.MayBegin(102));
 }
 
 TEST_F(PoolTest, FollowsWhatWaitsUpToTheMaximum) {

@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <grp.h>
 #include <gtest/gtest.h>
 #include <locale.h>
 #include <pthread.h>
@@ -17,6 +18,7 @@
 #include <functional>
 #include <iostream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "tests/support/Child.h"
@@ -120,6 +122,13 @@ const Change kChanges[] = {
      [] { return ActionOf(SIGPIPE).sa_handler == SIG_IGN; }},
     {"a handler of a real-time signal", [] { (void)signal(SIGRTMAX, Ignore); }, "signal 64",
      [] { return ActionOf(SIGRTMAX).sa_handler == SIG_DFL; }},
+    {"what becomes of ended children",
+     [] {
+         struct sigaction action = {};
+         action.sa_flags = SA_NOCLDWAIT;
+         (void)sigaction(SIGCHLD, &action, nullptr);
+     },
+     "signal 17", [] { return (ActionOf(SIGCHLD).sa_flags & SA_NOCLDWAIT) == 0; }},
     {"a blocked signal", [] { Block(SIGTERM); }, "blocked", [] { return !IsBlocked(SIGTERM); }},
     {"priority", [] { (void)setpriority(PRIO_PROCESS, 0, 7); }, "priority",
      [] { return getpriority(PRIO_PROCESS, 0) == (geteuid() == 0 ? 0 : 7); }},
@@ -166,12 +175,15 @@ class ToStandardError : public testing::EmptyTestEventListener {
     }
 };
 
+void IgnoreOtherwise(int) {}
+
 // Runs in a child, with what a worker has.
 int InWorker(const std::function<void(ProcessState*)>& body) {
     const support::ChildResult result = support::InChild([&] {
         (void)!chdir("/");
         (void)umask(027);
         (void)signal(SIGPIPE, SIG_IGN);
+        (void)signal(SIGUSR1, Ignore);
         (void)setlocale(LC_ALL, "C");
         testing::UnitTest::GetInstance()->listeners().Append(new ToStandardError);
         ProcessState state("/nowhere");
@@ -221,6 +233,24 @@ TEST_P(ProcessStateChange, IsFoundAndPutBack) {
 INSTANTIATE_TEST_SUITE_P(EachKind, ProcessStateChange, testing::ValuesIn(kChanges),
                          [](const auto& row) { return Named(row.param.name); });
 
+TEST(ProcessState, FindsAnotherHandlerInThePlaceOfOne) {
+    EXPECT_EQ(0, InWorker([](ProcessState* state) {
+                  (void)signal(SIGUSR1, IgnoreOtherwise);
+                  EXPECT_EQ(Strings{"signal 10 is handled otherwise"}, state->Restore());
+                  EXPECT_EQ(Ignore, ActionOf(SIGUSR1).sa_handler);
+              }));
+}
+
+// The C library handles a signal of its own once there has been a thread.
+TEST(ProcessState, SaysNothingOfAThreadThatHasEnded) {
+    EXPECT_EQ(0, InWorker([](ProcessState* state) {
+                  std::thread([] {}).join();
+                  EXPECT_EQ(Strings(), state->Restore());
+                  (void)signal(SIGUSR2, Ignore);
+                  EXPECT_EQ(Strings{"signal 12 is handled otherwise"}, state->Restore());
+              }));
+}
+
 TEST(ProcessState, FindsAStreamThatCannotBePutBack) {
     EXPECT_EQ(0, InWorker([](ProcessState* state) {
                   (void)std::fclose(stdin);
@@ -256,6 +286,29 @@ TEST(ProcessState, FindsAnotherUser) {
                   EXPECT_EQ(Strings{"the user or group is another"}, state->Restore());
                   EXPECT_EQ(0u, geteuid());
                   EXPECT_EQ(0u, getegid());
+              }));
+}
+
+TEST(ProcessState, FindsMoreGroups) {
+    if (geteuid() != 0) {
+        GTEST_SKIP() << "only root may change them";
+    }
+    EXPECT_EQ(0, InWorker([](ProcessState* state) {
+                  const int before = getgroups(0, nullptr);
+                  const gid_t more[] = {65533, 65534};
+                  ASSERT_EQ(0, setgroups(2, more));
+                  EXPECT_EQ(Strings{"the user or group is another"}, state->Restore());
+                  EXPECT_EQ(before, getgroups(0, nullptr));
+              }));
+}
+
+TEST(ProcessState, TellsHowMuchMemoryThereIs) {
+    EXPECT_EQ(0, InWorker([](ProcessState* state) {
+                  const long long before = state->PrivateKiB();
+                  EXPECT_GT(before, 0);
+                  const std::vector<char> taken(size_t{8} << 20, 'x');
+                  EXPECT_EQ(Strings(), state->Restore());
+                  EXPECT_GE(state->PrivateKiB(), before + 8000 + taken[0] - 'x');
               }));
 }
 
@@ -307,16 +360,31 @@ TEST(ProcessState, SaysNothingOfWhatEveryRequestLeaves) {
               }));
 }
 
-TEST(ProcessState, LetsAChildThatStillRunsBe) {
+// As background tasks and callbacks do, perhaps a moment later.
+TEST(ProcessState, LetsAChildOfASessionOfItsOwnBe) {
     EXPECT_EQ(0, InWorker([](ProcessState* state) {
                   const pid_t child = fork();
                   if (child == 0) {
+                      (void)usleep(10000);
+                      (void)setsid();
                       (void)pause();
                       _exit(0);
                   }
                   EXPECT_EQ(Strings(), state->Restore());
                   EXPECT_EQ(0, kill(child, SIGKILL));
                   EXPECT_EQ(child, waitpid(child, nullptr, 0));
+              }));
+}
+
+TEST(ProcessState, EndsAChildThatStillRuns) {
+    EXPECT_EQ(0, InWorker([](ProcessState* state) {
+                  const pid_t child = fork();
+                  if (child == 0) {
+                      (void)pause();
+                      _exit(0);
+                  }
+                  EXPECT_EQ(Strings{"a child still runs"}, state->Restore());
+                  EXPECT_EQ(-1, kill(child, 0));
               }));
 }
 

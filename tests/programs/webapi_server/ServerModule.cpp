@@ -54,6 +54,15 @@ void HangWithChild(APIRequest* request, APIResponse* response) {
     Hang(request, response);
 }
 
+// A child that holds on to the connection, and a parent that has done its work.
+void LeaveChild(APIRequest* request, APIResponse* response) {
+    if (fork() == 0) {
+        (void)sleep(600);
+        _exit(0);
+    }
+    Echo(request, response);
+}
+
 void Crash(APIRequest*, APIResponse*) {
     (void)raise(SIGSEGV);
 }
@@ -76,6 +85,13 @@ void Stream(APIRequest*, APIResponse* response) {
     }
 }
 
+// One that is larger than what is under way at any time.
+void Flood(APIRequest*, APIResponse* response) {
+    response->SetEnableOutput(false);
+    WriteText("Content-Type: text/plain\r\n\r\n");
+    WriteText(std::string(8u << 20, 'x'));
+}
+
 // One that comes to nothing half way.
 void Stall(APIRequest* request, APIResponse* response) {
     WriteText("Content-Type: text/plain\r\n\r\npart ");
@@ -92,6 +108,7 @@ TALO::_tag_API_TABLE table[] = {
     {nullptr, 1, "echo", Echo},     {nullptr, 1, "dawdle", Dawdle},
     {nullptr, 1, "hang", Hang},     {nullptr, 1, "hangWithChild", HangWithChild},
     {nullptr, 1, "crash", Crash},   {nullptr, 1, "vanish", Vanish},
+    {nullptr, 1, "flood", Flood},   {nullptr, 1, "leaveChild", LeaveChild},
     {nullptr, 1, "stream", Stream}, {nullptr, 1, "stall", Stall},
     {nullptr, 0, nullptr, nullptr},
 };

@@ -55,10 +55,11 @@ void Leave(APIRequest* request, APIResponse* response) {
     response->SetSuccess(what);
 }
 
-// Answers the id of a child that stays for as long as nobody ends it.
+// Answers the id of a child that stays, detached, for as long as nobody ends it.
 void Child(APIRequest*, APIResponse* response) {
     const pid_t child = fork();
     if (child == 0) {
+        (void)setsid();
         (void)pause();
         _exit(0);
     }

@@ -184,6 +184,29 @@ TEST_F(WorkerLife, ServesABodyAndLeavesNoneOfItToTheNextRequest) {
     EXPECT_EQ("", Body(Call("echo"))["data"]["text"].asString());
 }
 
+// A web server that sends all of a body before it looks for a reply would lose this one.
+TEST_F(WorkerLife, TakesTheRestOfABodyThatItHasRefused) {
+    Start();
+    const std::string block(size_t{1} << 20, 'x');
+    constexpr int kBlocks = 17;
+    const std::string head =
+        support::HeaderBlock({{"CONTENT_LENGTH", std::to_string(kBlocks * block.size())},
+                              {"SCGI", "1"},
+                              {"REQUEST_METHOD", "POST"},
+                              {"CONTENT_TYPE", "application/x-www-form-urlencoded"}});
+    const int connection = Connect();
+    ASSERT_EQ(static_cast<ssize_t>(head.size()), write(connection, head.data(), head.size()));
+    EXPECT_EQ(101, Body(ReadAll(connection))["error"]["code"].asInt());
+    for (int sent = 0; sent < kBlocks; ++sent) {
+        ASSERT_EQ(static_cast<ssize_t>(block.size()),
+                  send(connection, block.data(), block.size(), MSG_NOSIGNAL))
+            << sent << " MiB sent";
+    }
+    (void)close(connection);
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ("hi", Body(Call("echo", "text=hi"))["data"]["text"].asString());
+}
+
 TEST_F(WorkerLife, EndsAfterARequestToAnAPIThatPromisesNothing) {
     Start();
     EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo&text=x"))["success"].asBool());

@@ -1,5 +1,6 @@
 """The built server over an API of the tests' own, and an SCGI client for it."""
 
+import contextlib
 import json
 import os
 import shutil
@@ -16,10 +17,11 @@ MODULE = os.environ["SERVER_MODULE"]
 OTHER_MODULE = os.environ["OTHER_SERVER_MODULE"]
 LIVING = "Probe.ServerLiving"
 ONCE = "Probe.ServerOnce"
+PATIENT = "Probe.ServerPatient"  # lives on, and may take as long as it likes
 BAD_MODULE = os.environ["BAD_SERVER_MODULE"]
 BAD = "Probe.ServerBad"
-METHODS = ["echo", "dawdle", "hang", "hangWithChild", "crash", "vanish"]
-METHODS += [{"stream": {"allowDownload": True}}, {"stall": {"allowDownload": True}}]
+METHODS = ["echo", "dawdle", "hang", "hangWithChild", "leaveChild", "crash", "vanish"]
+METHODS += [{name: {"allowDownload": True}} for name in ("stream", "stall", "flood")]
 LONG = 60
 
 
@@ -30,13 +32,13 @@ def netstring(variables):
     return str(len(block)).encode() + b":" + block + b","
 
 
-def query_request(api, method, **parameters):
+def query_request(api, method, length=0, **parameters):
     query = f"api={api}&version=1&method={method}"
     for name, value in parameters.items():
         query += f"&{name}={value}"
     return netstring(
         {
-            "CONTENT_LENGTH": "0",
+            "CONTENT_LENGTH": str(length),
             "SCGI": "1",
             "GATEWAY_INTERFACE": "CGI/1.1",
             "REQUEST_METHOD": "GET",
@@ -85,14 +87,14 @@ class ServerTest(unittest.TestCase):
     def setUpClass(cls):
         cls.folder = tempfile.mkdtemp(prefix="webapi-server-")
         cls.libraries = {}
-        for api in (LIVING, ONCE):
+        for api in (LIVING, ONCE, PATIENT):
             cls.libraries[api] = os.path.join(cls.folder, api + ".so")
             shutil.copyfile(MODULE, cls.libraries[api])
             cls.describe(api)
 
     @classmethod
     def tearDownClass(cls):
-        for api in (LIVING, ONCE):
+        for api in (LIVING, ONCE, PATIENT):
             cls.forget(api)
         shutil.rmtree(cls.folder)
 
@@ -103,11 +105,11 @@ class ServerTest(unittest.TestCase):
             "minVersion": 1,
             "maxVersion": 1,
             "authLevel": 0,
-            "deadline": 1,
+            "deadline": 0 if api == PATIENT else 1,
             "methods": {"1": methods or METHODS},
         }
         document.update(members)
-        if api == LIVING:
+        if api in (LIVING, PATIENT):
             document["isolation"] = "worker"
         name = os.path.join(WEBAPI_DIR, api + ".lib")
         with open(name + ".new", "w", encoding="utf-8") as file:
@@ -165,6 +167,30 @@ class ServerTest(unittest.TestCase):
                 pass
         return found
 
+    def busy(self):
+        """The workers that have read a request and are not done with it."""
+        found = []
+        for process in self.processes():
+            with contextlib.suppress(OSError):
+                if os.readlink(f"/proc/{process}/fd/0").startswith("socket:"):
+                    found.append(process)
+        return found
+
+    def occupy(self, count=1):
+        """Connections, each with a worker that hangs until it is killed."""
+        connections = [self.connect() for _ in range(count)]
+        for connection in connections:
+            self.addCleanup(connection.close)
+            connection.sendall(query_request(PATIENT, "hang"))
+        self.assertTrue(wait_for(lambda: len(self.busy()) == count), self.busy())
+        return connections
+
+    def free(self):
+        """Ends what `occupy` began."""
+        for worker in self.busy():
+            with contextlib.suppress(ProcessLookupError):
+                os.kill(worker, signal.SIGKILL)
+
     def connect(self):
         connection = socket.socket(socket.AF_UNIX)
         connection.settimeout(LONG)
@@ -174,6 +200,12 @@ class ServerTest(unittest.TestCase):
             connection.close()
             raise
         return connection
+
+    @staticmethod
+    def send_while_taken(connection, data):
+        """Who answers before it has read everything may refuse the rest."""
+        with contextlib.suppress(BrokenPipeError, ConnectionResetError):
+            connection.sendall(data)
 
     @staticmethod
     def read_all(connection):

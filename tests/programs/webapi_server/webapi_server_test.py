@@ -12,7 +12,7 @@ import time
 import unittest
 
 import scgi_server
-from scgi_server import LIVING, LONG, ONCE, SERVER, Reply, query_request, wait_for
+from scgi_server import LIVING, LONG, ONCE, PATIENT, SERVER, Reply, query_request, wait_for
 
 
 class Answers(scgi_server.ServerTest):
@@ -64,33 +64,29 @@ class Answers(scgi_server.ServerTest):
 
     def test_answers_503_when_too_many_wait(self):
         self.start("--min-workers", "1", "--max-workers", "1", "--queue", "2")
-        self.echo()
+        self.occupy()
         connections = [self.connect() for _ in range(8)]
         for connection in connections:
-            connection.sendall(query_request(LIVING, "dawdle", milliseconds=300))
-        replies = []
-        for connection in connections:
+            connection.sendall(query_request(LIVING, "echo"))
+        for connection in connections[2:]:
             with connection:
-                replies.append(Reply(self.read_all(connection)))
-        refused = [reply for reply in replies if reply.status == 503]
-        # One may have come before the worker was ready again.
-        self.assertIn(len(refused), (5, 6))
-        for reply in refused:
+                reply = Reply(self.read_all(connection))
+            self.assertEqual(reply.status, 503)
             self.assertEqual(reply.body, {"success": False, "error": {"code": 100}})
-        served = sum(reply.body["success"] for reply in replies)
-        self.assertEqual(served + len(refused), len(replies))
+        self.free()
+        for connection in connections[:2]:
+            with connection:
+                self.assertIs(Reply(self.read_all(connection)).body["success"], True)
 
     def test_answers_503_to_who_is_still_sending(self):
         self.start("--min-workers", "1", "--max-workers", "1", "--queue", "1")
-        self.echo()
-        busy = [self.connect() for _ in range(2)]
-        for connection in busy:
-            connection.sendall(query_request(LIVING, "dawdle", milliseconds=500))
-        with self.connect() as connection:
-            connection.sendall(query_request(LIVING, "echo") + b"x" * (4 << 20))
+        self.occupy()
+        waiting = self.connect()
+        with waiting, self.connect() as connection:
+            body = b"x" * (4 << 20)
+            self.send_while_taken(connection, query_request(LIVING, "echo") + body)
             self.assertEqual(Reply(self.read_all(connection)).status, 503)
-        for connection in busy:
-            connection.close()
+        self.free()
 
     def test_answers_500_when_a_method_crashes(self):
         self.start()
@@ -147,13 +143,10 @@ class Workers(scgi_server.ServerTest):
     def test_has_workers_ready_and_more_under_load(self):
         self.start("--min-workers", "2", "--max-workers", "6")
         self.assertTrue(wait_for(lambda: len(self.processes()) == 4), self.processes())
-        connections = [self.connect() for _ in range(6)]
-        for connection in connections:
-            connection.sendall(query_request(LIVING, "dawdle", milliseconds=800))
-        self.assertTrue(wait_for(lambda: len(self.processes()) == 8), self.processes())
-        for connection in connections:
-            with connection:
-                self.read_all(connection)
+        self.occupy(6)
+        self.assertEqual(len(self.processes()), 8)
+        self.free()
+        self.echo()
         self.assertLessEqual(len(self.processes()), 8)
 
     def test_replaces_a_worker_that_died_while_idle(self):
@@ -211,8 +204,10 @@ class Workers(scgi_server.ServerTest):
                     found.append(os.readlink(f"{folder}/{name}").split(":")[0])
             return found
 
+        # Longer than the server waits before it looks for changes.
+        self.assertTrue(wait_for(lambda: len(self.processes()) == 3))
         looks = []
-        while looks[-5:] != 5 * looks[-1:] or len(looks) < 5:
+        while looks[-20:] != 20 * looks[-1:] or len(looks) < 20:
             time.sleep(0.1)
             looks.append(sorted(descriptors()))
         before = looks[-1]
@@ -226,8 +221,8 @@ class Workers(scgi_server.ServerTest):
         server = self.start()
         self.echo()
         with self.connect() as connection:
-            connection.sendall(query_request(LIVING, "dawdle", milliseconds=500, nonce="late"))
-            time.sleep(0.2)
+            connection.sendall(query_request(PATIENT, "dawdle", milliseconds=500, nonce="late"))
+            self.assertTrue(wait_for(self.busy))
             server.kill()
             server.wait()
             self.assertEqual(Reply(self.read_all(connection)).body["data"]["nonce"], "late")
@@ -251,16 +246,12 @@ class Signals(scgi_server.ServerTest):
 
     def test_ends_at_once_when_told_twice(self):
         server = self.start("--min-workers", "1")
-        self.describe(LIVING, deadline=0)
-        self.addCleanup(self.describe, LIVING)
-        with self.connect() as connection:
-            connection.sendall(query_request(LIVING, "hang"))
-            time.sleep(0.3)
-            server.send_signal(signal.SIGTERM)
-            time.sleep(0.3)
-            self.assertIsNone(server.poll())
-            server.send_signal(signal.SIGTERM)
-            self.assertEqual(Reply(self.read_all(connection)).status, 504)
+        [connection] = self.occupy()
+        server.send_signal(signal.SIGTERM)
+        time.sleep(0.3)
+        self.assertIsNone(server.poll())
+        server.send_signal(signal.SIGTERM)
+        self.assertEqual(Reply(self.read_all(connection)).status, 504)
         self.assertEqual(server.wait(LONG), 0)
 
     def test_loses_no_request_when_it_loads_anew(self):
