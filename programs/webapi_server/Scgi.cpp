@@ -5,6 +5,7 @@
 #include <sys/socket.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <cstring>
 #include <limits>
 
@@ -15,6 +16,11 @@ namespace {
 // What 64 bits with a sign hold. Whether there is room for so much is the method's
 // business.
 constexpr char kMostLength[] = "9223372036854775807";
+
+// nginx announces as the length what it has read of a body that it passes on while it
+// comes. By this variable it says how long all of it will be.
+constexpr char kWholeLength[] = "WEBAPI_CONTENT_LENGTH=";
+constexpr char kLength[] = "CONTENT_LENGTH=";
 
 bool IsDigit(char byte) {
     return byte >= '0' && byte <= '9';
@@ -126,6 +132,35 @@ bool IsLength(const std::string& value) {
            (value.size() < kMostDigits || (value.size() == kMostDigits && value <= kMostLength));
 }
 
+std::string ValueOf(const std::string& variable) {
+    return variable.substr(variable.find('=') + 1);
+}
+
+// The whole length, where there is one, takes the place of the announced one.
+ScgiResult SettleLength(std::vector<std::string>* variables, std::string* reason) {
+    const auto isWhole = [](const std::string& variable) {
+        return variable.rfind(kWholeLength, 0) == 0;
+    };
+    const auto whole = std::find_if(variables->begin(), variables->end(), isWhole);
+    if (whole == variables->end()) {
+        return ScgiResult::kRead;
+    }
+    if (std::find_if(whole + 1, variables->end(), isWhole) != variables->end()) {
+        return Malformed(reason, "WEBAPI_CONTENT_LENGTH is there twice");
+    }
+    const std::string length = ValueOf(*whole);
+    if (!IsLength(length)) {
+        return Malformed(reason, "WEBAPI_CONTENT_LENGTH is no number");
+    }
+    const std::string announced = ValueOf(variables->front());
+    if (std::strtoll(length.c_str(), nullptr, 10) < std::strtoll(announced.c_str(), nullptr, 10)) {
+        return Malformed(reason, "WEBAPI_CONTENT_LENGTH is less than CONTENT_LENGTH");
+    }
+    variables->erase(whole);
+    variables->front() = kLength + length;
+    return ScgiResult::kRead;
+}
+
 // The piece that begins there, up to its NUL; `at` moves behind it.
 bool NextPiece(const std::string& block, size_t* at, std::string* piece) {
     const size_t end = block.find('\0', *at);
@@ -171,8 +206,11 @@ ScgiResult ParseBlock(const std::string& block, std::vector<std::string>* variab
     if (!hasVersion) {
         return Malformed(reason, found.empty() ? "there are no variables" : "SCGI is missing");
     }
-    variables->swap(found);
-    return ScgiResult::kRead;
+    const ScgiResult result = SettleLength(&found, reason);
+    if (result == ScgiResult::kRead) {
+        variables->swap(found);
+    }
+    return result;
 }
 
 }  // namespace

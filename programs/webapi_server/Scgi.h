@@ -19,7 +19,9 @@ struct ScgiLimits {
 
 // Reads the header block of an SCGI request off a connection, and not a byte of
 // the body behind it: that stays for whoever reads the connection next. Each
-// variable is "NAME=value". `reason` says in words what is wrong.
+// variable is "NAME=value", the first of them CONTENT_LENGTH: with the value of
+// WEBAPI_CONTENT_LENGTH, which is not among them, where the web server sent one.
+// `reason` says in words what is wrong.
 ScgiResult ReadScgiRequest(int connection, const ScgiLimits& limits,
                            std::vector<std::string>* variables, std::string* reason);
 

@@ -10,7 +10,7 @@ import tempfile
 import threading
 
 from client import ENTRY, Client
-from volumes import entries
+from volumes import entries, forget_peaks
 from webserver import HOST, PROJECT, WebServer
 
 PASSWORD = "correct horse, battery"
@@ -168,6 +168,9 @@ class Appliance:
     def entries(self):
         """The ids of the entry processes that work for this appliance."""
         return entries(self.server, self.server.script.process.pid)
+
+    def forget_peaks(self):
+        forget_peaks(self.server, self.server.script.process.pid)
 
     # Other appliances
 

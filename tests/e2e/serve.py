@@ -64,9 +64,16 @@ class Serve(unittest.TestCase):
         self.assertIn(f"ready http{'s' * tls}://{HOST}:{port}/\n", script.output)
         client = Client(HOST, port, self.certificate(script, state) if tls else None)
         self.assertIn(b'"success":true', client.get(PING).body)
+        self.assertEqual(self.has_workers(port), "cgi" not in arguments)
         self.logs_in(script, client, state)
         self.assertTrue(wait_until(lambda: "".join(script.output).count("curl ") == 8))
         return script, port, client
+
+    def has_workers(self, port):
+        """Whether workers stand ready for the server of this port."""
+        return any("webapi-server" in line
+                   for line in processes_that_mention(str(self.checkout))
+                   if re.search(rf"/run/\w+-{port}\b", line))
 
     def certificate(self, script, state):
         """The certificate that was made is shown, and its key is nobody else's to read."""
@@ -118,9 +125,10 @@ class Serve(unittest.TestCase):
         self.serves_and_stops(signal.SIGTERM)
         self.serves_and_stops(signal.SIGINT)
         for server in ("lighttpd", "nginx", "apache"):
-            for number in (signal.SIGINT, signal.SIGTERM):
-                with self.subTest(server, signal=number):
-                    self.serves_and_stops(number, "--server", server)
+            for number, mode in ((signal.SIGINT, "warm"), (signal.SIGTERM, "warm"),
+                                 (signal.SIGTERM, "cgi")):
+                with self.subTest(server, signal=number, mode=mode):
+                    self.serves_and_stops(number, "--server", server, "--mode", mode)
         del self.administrators[""]
         self.serves_and_stops(signal.SIGTERM, "--reset")
 
@@ -184,8 +192,8 @@ class Serve(unittest.TestCase):
 
     def test_refuses_wrong_arguments(self):
         for arguments in (["--port", "0"], ["--port", "65536"], ["--port", "x"], ["--port"],
-                          ["--server", "iis"], ["--bind", "a b"], ["--speed"], ["--state"],
-                          ["--state", "", "--reset"]):
+                          ["--server", "iis"], ["--mode", "hot"], ["--mode"], ["--bind", "a b"],
+                          ["--speed"], ["--state"], ["--state", "", "--reset"]):
             with self.subTest(arguments):
                 script = self.start(*arguments)
                 self.assertEqual(script.process.wait(timeout=60), 2)

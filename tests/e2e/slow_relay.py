@@ -20,6 +20,7 @@ class PeakMemory:
     def __init__(self, appliance):
         self.kibibytes = 0
         self._appliance = appliance
+        appliance.forget_peaks()
         self._stop = threading.Event()
         self._thread = threading.Thread(target=self._watch, daemon=True)
         self._thread.start()

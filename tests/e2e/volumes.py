@@ -15,23 +15,42 @@ def file_call(method, **parameters):
     return form(api="Test.File", version=1, method=method, **parameters)
 
 
-def entries(server, like="self"):
-    """The ids of the processes of a server's root that serve a request, as the process
-    `like` sees it. Others may run, of other roots that are mounted at the same place."""
+def processes(server, like="self"):
+    """The program's processes of a server's root, as the process `like` sees it. Others may
+    run, of other roots that are mounted at the same place."""
     program = str(server.warm_program if server.mode == "warm" else server.entry)
     mounts = os.readlink(f"/proc/{like}/ns/mnt")
-    found = []
     for process in pathlib.Path("/proc").glob("[0-9]*"):
         try:
             if (os.readlink(process / "exe") == program and
-                    os.readlink(process / "ns/mnt") == mounts and
-                    # A worker that waits has no connection there.
-                    (server.mode == "cgi" or
-                     os.readlink(process / "fd/0").startswith("socket:"))):
+                    os.readlink(process / "ns/mnt") == mounts):
+                yield process
+        except OSError:
+            pass
+
+
+def entries(server, like="self"):
+    """The ids of those that serve a request."""
+    found = []
+    for process in processes(server, like):
+        try:
+            # A worker that waits has no connection there.
+            if (server.mode == "cgi" or
+                    os.readlink(process / "fd/0").startswith("socket:")):
                 found.append(int(process.name))
         except OSError:
             pass
     return found
+
+
+def forget_peaks(server, like="self"):
+    """The most memory that a worker has had may be of a request that it served before: a
+    login takes 16 MiB for a moment."""
+    for process in processes(server, like):
+        try:
+            (process / "clear_refs").write_text("5")
+        except (FileNotFoundError, ProcessLookupError):
+            pass
 
 
 class VolumeCase(Case):

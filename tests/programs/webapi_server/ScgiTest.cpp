@@ -61,6 +61,11 @@ class ScgiRequest : public testing::Test {
 const std::string kGood = HeaderBlock({{"CONTENT_LENGTH", "5"}, {"SCGI", "1"}, {"A", "b=c"}});
 const Strings kGoodVariables = {"CONTENT_LENGTH=5", "SCGI=1", "A=b=c"};
 
+// Five bytes are announced.
+std::string WithWholeLength(const std::string& length) {
+    return HeaderBlock({{"CONTENT_LENGTH", "5"}, {"SCGI", "1"}, {"WEBAPI_CONTENT_LENGTH", length}});
+}
+
 }  // namespace
 
 TEST_F(ScgiRequest, ReadsTheVariablesAndLeavesTheBody) {
@@ -148,6 +153,37 @@ TEST_F(ScgiRequest, KeepsARepeatedHeaderOfTheClient) {
     EXPECT_EQ((Strings{"CONTENT_LENGTH=0", "SCGI=1", "HTTP_X=1", "HTTP_X=2"}), variables_);
 }
 
+TEST_F(ScgiRequest, TakesTheLengthOfABodyThatIsStillComingFromAVariableOfItsOwn) {
+    const struct {
+        const char* announced;
+        const char* whole;
+    } cases[] = {
+        {"0", "0"},    {"0", "5"},  {"5", "5"},
+        {"5", "1000"}, {"9", "10"}, {"0", "9223372036854775807"},
+    };
+    for (const auto& lengths : cases) {
+        SCOPED_TRACE(lengths.whole);
+        Send(HeaderBlock({{"CONTENT_LENGTH", lengths.announced},
+                          {"SCGI", "1"},
+                          {"WEBAPI_CONTENT_LENGTH", lengths.whole},
+                          {"A", "b"}}));
+        ASSERT_EQ(ScgiResult::kRead, Read()) << reason_;
+        EXPECT_EQ((Strings{std::string("CONTENT_LENGTH=") + lengths.whole, "SCGI=1", "A=b"}),
+                  variables_);
+    }
+}
+
+TEST_F(ScgiRequest, LeavesVariablesThatOnlyLookLikeALength) {
+    Send(HeaderBlock({{"CONTENT_LENGTH", "5"},
+                      {"SCGI", "1"},
+                      {"WEBAPI_CONTENT_LENGTH_", "7"},
+                      {"HTTP_WEBAPI_CONTENT_LENGTH", "8"}}));
+    ASSERT_EQ(ScgiResult::kRead, Read()) << reason_;
+    EXPECT_EQ((Strings{"CONTENT_LENGTH=5", "SCGI=1", "WEBAPI_CONTENT_LENGTH_=7",
+                       "HTTP_WEBAPI_CONTENT_LENGTH=8"}),
+              variables_);
+}
+
 TEST_F(ScgiRequest, RefusesWhatIsNoRequest) {
     const struct {
         const char* name;
@@ -191,6 +227,19 @@ TEST_F(ScgiRequest, RefusesWhatIsNoRequest) {
          HeaderBlock({{"CONTENT_LENGTH", "0"}, {"SCGI", "1"}, {"A\nB", "c"}})},
         {"a name with DEL", HeaderBlock({{"CONTENT_LENGTH", "0"}, {"SCGI", "1"}, {"A\x7f", "c"}})},
         {"an empty name", HeaderBlock({{"CONTENT_LENGTH", "0"}, {"SCGI", "1"}, {"", "c"}})},
+        {"a whole length below the announced one", WithWholeLength("4")},
+        {"an empty whole length", WithWholeLength("")},
+        {"a negative whole length", WithWholeLength("-6")},
+        {"a signed whole length", WithWholeLength("+6")},
+        {"a whole length behind a blank", WithWholeLength(" 6")},
+        {"a whole length before a blank", WithWholeLength("6 ")},
+        {"a hexadecimal whole length", WithWholeLength("0x6")},
+        {"a huge whole length", WithWholeLength("9223372036854775808")},
+        {"a whole length of very many digits", WithWholeLength(std::string(1000, '9'))},
+        {"a whole length twice", HeaderBlock({{"CONTENT_LENGTH", "5"},
+                                              {"SCGI", "1"},
+                                              {"WEBAPI_CONTENT_LENGTH", "6"},
+                                              {"WEBAPI_CONTENT_LENGTH", "6"}})},
     };
     for (const auto& refused : cases) {
         SCOPED_TRACE(refused.name);
