@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <poll.h>
 #include <pthread.h>
 #include <signal.h>
 #include <stdlib.h>
@@ -99,6 +100,14 @@ void EndInputBehindBody() {
         }
         (void)usleep(1000);
     }
+}
+
+// Whether more of the body arrives, from a client that has been refused.
+bool IsBodyStillComing() {
+    constexpr int kMostMilliseconds = 20;
+    struct pollfd input = {STDIN_FILENO, POLLIN, 0};
+    char first = 0;
+    return poll(&input, 1, kMostMilliseconds) > 0 && recv(STDIN_FILENO, &first, 1, MSG_PEEK) > 0;
 }
 
 // Standard input and output while there is no request.
@@ -207,15 +216,18 @@ bool Worker::Serve(int connection) {
     return true;
 }
 
-// The reply ends for the web server before the rest of the body is taken: it has
-// no more to say then, and closes its side.
+// Where nothing of the body is left, the reply ends for the web server before anything
+// else: it closes its side then. Some would also close the client's, which would lose
+// the reply if it still sends: in that case the rest is taken first.
 bool Worker::ServeRead(std::vector<std::string> variables) {
     environment_.Enter(std::move(variables));
     EndInputBehindBody();
     BeginCrashReply(&slot_->answerBegun);
     const bool livesOn = Run();
     EndCrashReply();
-    (void)shutdown(STDOUT_FILENO, SHUT_WR);
+    if (!IsBodyStillComing()) {
+        (void)shutdown(STDOUT_FILENO, SHUT_WR);
+    }
     DiscardInput(true);
     (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
     nowhere_.Take();

@@ -1,5 +1,6 @@
 """A small HTTP client: ordinary requests, and bytes as one likes."""
 
+import contextlib
 import http.client
 import json
 import socket
@@ -61,7 +62,9 @@ class Client:
     def request(self, method, path, body=None, headers=None):
         connection = self.connection()
         try:
-            connection.request(method, path, body, {"Connection": "close", **(headers or {})})
+            # Who refuses a body answers before it has come, and takes no more of it.
+            with contextlib.suppress(BrokenPipeError, ConnectionResetError):
+                connection.request(method, path, body, {"Connection": "close", **(headers or {})})
             return _read(connection.getresponse())
         finally:
             connection.close()
