@@ -207,6 +207,29 @@ TEST_F(WorkerLife, TakesTheRestOfABodyThatItHasRefused) {
     EXPECT_EQ("hi", Body(Call("echo", "text=hi"))["data"]["text"].asString());
 }
 
+// A web server that closes a client's side behind the reply would cut off who still sends.
+TEST_F(WorkerLife, EndsItsReplyBehindABodyThatStillComes) {
+    Start();
+    const int connection = Connect();
+    const std::string head = support::HeaderBlock({{"CONTENT_LENGTH", "20000000"},
+                                                   {"SCGI", "1"},
+                                                   {"REQUEST_METHOD", "POST"},
+                                                   {"CONTENT_TYPE", "text/plain"}});
+    ASSERT_EQ(static_cast<ssize_t>(head.size()), write(connection, head.data(), head.size()));
+    std::string reply;
+    for (int sent = 0; sent < 100; ++sent) {
+        ASSERT_EQ(1, send(connection, "x", 1, MSG_NOSIGNAL));
+        (void)usleep(5000);
+        char block[4096];
+        const ssize_t got = recv(connection, block, sizeof block, MSG_DONTWAIT);
+        ASSERT_NE(0, got) << sent;
+        reply.append(block, got > 0 ? static_cast<size_t>(got) : 0);
+    }
+    EXPECT_EQ(101, Body(reply + ReadAll(connection))["error"]["code"].asInt());
+    (void)close(connection);
+    EXPECT_TRUE(SaysIdle());
+}
+
 TEST_F(WorkerLife, EndsAfterARequestToAnAPIThatPromisesNothing) {
     Start();
     EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo&text=x"))["success"].asBool());
