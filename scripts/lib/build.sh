@@ -21,15 +21,15 @@ configure_and_build() {
         die "preset $preset cannot be built"
 }
 
-# run_tests PRESET [ARGUMENT OF ctest]...: one more at a time than there are
-# processors, because many of them wait. What failed stands at the very end, where a
+# run_tests PRESET [ARGUMENT OF ctest]...: more at a time than there are processors,
+# because many of them wait: one more, or tests_ahead. What failed stands at the very end, where a
 # record that is cut still has it.
 run_tests() {
     local preset=$1 report status=0
     report="$(build_folder "$preset")/Testing/tests.xml"
     shift
     rm -f "$report"
-    ctest --test-dir "$(build_folder "$preset")" -j"$(($(nproc) + 1))" --output-on-failure \
+    ctest --test-dir "$(build_folder "$preset")" -j"$(($(nproc) + ${tests_ahead:-1}))" --output-on-failure \
         --output-junit "$report" --test-output-truncation head --no-tests=error "$@" || status=$?
     if [[ $status -ne 0 && -f $report ]]; then
         python3 "$project/scripts/lib/failed_tests.py" "$report" || true
