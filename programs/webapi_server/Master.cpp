@@ -25,18 +25,21 @@ constexpr long long kAfterDraining = 2000;
 constexpr int kLookAgain = 2;  // who waits while workers do may begin soon
 constexpr long long kRefusalLogPause = 10000;
 
-int OpenSignals() {
+sigset_t SignalsOfMaster() {
     sigset_t signals;
     (void)sigemptyset(&signals);
     for (int signal : {SIGTERM, SIGINT, SIGHUP, SIGCHLD}) {
         (void)sigaddset(&signals, signal);
     }
-    return sigprocmask(SIG_BLOCK, &signals, nullptr) == 0
-               ? signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK)
-               : -1;
+    return signals;
 }
 
 }  // namespace
+
+void HoldSignals(sigset_t* before) {
+    const sigset_t signals = SignalsOfMaster();
+    (void)sigprocmask(SIG_BLOCK, &signals, before);
+}
 
 Master::Master(Listener& listener, const Settings& settings, const OriginalProcess& original)
     : listener_(listener),
@@ -89,7 +92,8 @@ bool Master::Run() {
 }
 
 bool Master::Begin() {
-    signals_ = OpenSignals();
+    const sigset_t signals = SignalsOfMaster();
+    signals_ = signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK);
     isAccepting_ = signals_ >= 0 && slots_.IsMapped() &&
                    poller_.Add(signals_, {Source::kSignals, 0, 0}) &&
                    poller_.Add(listener_.Get(), {Source::kListener, 0, 0});

@@ -1,8 +1,14 @@
 #ifndef TALO_PROGRAMS_WEBAPI_SERVER_MASTER_H
 #define TALO_PROGRAMS_WEBAPI_SERVER_MASTER_H
 
+#include <signal.h>
+
 #include "programs/webapi_server/Listen.h"
 #include "programs/webapi_server/Workers.h"
+
+// Lets the signals that a Master reads wait until it runs; *before gets the mask that
+// was there.
+void HoldSignals(sigset_t* before);
 
 // The process that supervises: accepts every connection, hands it to a worker or
 // lets it wait, and answers in place of a worker that cannot. It reads no request and
@@ -14,8 +20,8 @@ class Master {
     Master(const Master&) = delete;
     Master& operator=(const Master&) = delete;
 
-    // Until SIGTERM or SIGINT, and the requests that were there by then are served.
-    // False when it could not begin.
+    // Behind HoldSignals. Until SIGTERM or SIGINT, and the requests that were there by
+    // then are served. False when it could not begin.
     bool Run();
 
   private:

@@ -50,10 +50,7 @@ void RaiseFileLimit(const Settings& settings, const struct rlimit& original) {
     (void)setrlimit(RLIMIT_NOFILE, &limit);
 }
 
-int Serve(Listener& listener, const Settings& settings) {
-    OriginalProcess original = {};
-    (void)sigprocmask(SIG_SETMASK, nullptr, &original.mask);
-    (void)getrlimit(RLIMIT_NOFILE, &original.files);
+int Serve(Listener& listener, const Settings& settings, const OriginalProcess& original) {
     RaiseFileLimit(settings, original.files);
     (void)signal(SIGPIPE, SIG_IGN);
     (void)signal(SIGCHLD, SIG_DFL);
@@ -85,6 +82,10 @@ int main(int argc, char** argv) {
     const bool isAdopting = path.empty() && handedOver == HandedOver::kSocket;
     (void)close_range(isAdopting ? kHandedOver + 1 : kHandedOver, ~0U, 0);
     openlog("webapi-server", LOG_PID, LOG_DAEMON);
+    OriginalProcess original = {};
+    (void)getrlimit(RLIMIT_NOFILE, &original.files);
+    // Whoever sees the socket may send a signal.
+    HoldSignals(&original.mask);
     Listener listener;
     const bool listens = isAdopting ? listener.Adopt(kHandedOver, &problem)
                                     : !path.empty() && listener.Make(path, kBacklog, &problem);
@@ -94,5 +95,5 @@ int main(int argc, char** argv) {
         return kCannotWork;
     }
     TidyStandardDescriptors();
-    return Serve(listener, arguments.settings);
+    return Serve(listener, arguments.settings, original);
 }

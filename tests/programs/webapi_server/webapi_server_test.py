@@ -244,6 +244,19 @@ class Signals(scgi_server.ServerTest):
         self.assertEqual(server.wait(LONG), 0)
         self.assertFalse(os.path.exists(self.socket))
 
+    def test_takes_signals_from_the_moment_there_is_a_socket(self):
+        for number in range(20):
+            path = os.path.join(self.folder, f"early-{number}")
+            server = subprocess.Popen([SERVER, "--socket", path], stdin=subprocess.DEVNULL)
+            self.addCleanup(self.stop, server, path)
+            ends = time.monotonic() + LONG
+            while not os.path.exists(path) and time.monotonic() < ends:
+                pass
+            server.send_signal(signal.SIGHUP)
+            server.send_signal(signal.SIGTERM)
+            self.assertEqual(server.wait(LONG), 0)
+            self.assertFalse(os.path.exists(path))
+
     def test_ends_at_once_when_told_twice(self):
         server = self.start("--min-workers", "1")
         [connection] = self.occupy()
