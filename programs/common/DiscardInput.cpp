@@ -3,6 +3,7 @@
 #include <limits.h>
 #include <poll.h>
 #include <string.h>
+#include <strings.h>
 #include <time.h>
 #include <unistd.h>
 
@@ -17,12 +18,18 @@ long MillisecondsNow() {
     return now.tv_sec * 1000 + now.tv_nsec / 1000000;
 }
 
+// What web servers pass on while it comes.
+bool IsUpload() {
+    const char* const type = getenv("CONTENT_TYPE");
+    const char* const name = getenv("HTTP_X_TYPE_NAME");
+    return (type != nullptr && strstr(type, "multipart/form-data") != nullptr) ||
+           (name != nullptr && strcasecmp(name, "sliceupload") == 0);
+}
+
 }  // namespace
 
 void DiscardInput(bool ends) {
-    const char* const type = getenv("CONTENT_TYPE");
-    const bool isComing =
-        ends || (type != nullptr && strstr(type, "multipart/form-data") != nullptr);
+    const bool isComing = ends || IsUpload();
     const long mostBytes = isComing ? LONG_MAX : 64L << 20;
     const long mostMilliseconds = isComing ? 10000 : 1000;
     constexpr long kPause = 1000;  // of whoever sends

@@ -5,6 +5,7 @@ import os
 import socket
 import subprocess
 import tempfile
+import time
 import unittest
 
 import installed
@@ -86,6 +87,28 @@ class EntryCgi(installed.ProbeTest):
         result = run(["/bin/sh", "-c", 'exec "$0" <&-', ENTRY_CGI], env=variables)
         self.assertEqual(result.returncode, 0)
         self.assertEqual(split_reply(result.stdout)[1]["error"]["code"], 101)
+
+    def test_takes_what_comes_of_a_refused_upload(self):
+        for variables in (
+            {"CONTENT_TYPE": "multipart/form-data; boundary=edge"},
+            {"CONTENT_TYPE": "application/octet-stream", "HTTP_X_TYPE_NAME": "SliceUpload"},
+        ):
+            with self.subTest(variables), subprocess.Popen(
+                [ENTRY_CGI],
+                bufsize=0,
+                stdin=subprocess.PIPE,
+                stdout=subprocess.PIPE,
+                env=environment(
+                    REQUEST_METHOD="POST",
+                    QUERY_STRING="api=TALO.File&version=1&method=upload_slice",
+                    CONTENT_LENGTH="200",
+                    **variables,
+                ),
+            ) as process:
+                time.sleep(0.2)  # refused by then
+                process.stdin.write(b"x" * 200)
+                process.stdin.close()
+                self.assertIs(split_reply(process.stdout.read())[1]["success"], False)
 
     def test_outlives_a_client_that_has_gone(self):
         for method in ("process", "large"):
