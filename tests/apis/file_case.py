@@ -88,7 +88,9 @@ class FileTest(ApplianceTest):
         SHARES_FILE.chmod(0o600)
         # Without a volume uploads go to file systems that are counted in 32 bits: whether
         # one fits would depend on how much the machine's disk holds at the moment.
-        appliance.configure(f'volumes="{self.top}"\nvolumes_folders="yes"\n')
+        volume = tempfile.mkdtemp(dir=ROOT)
+        self.addCleanup(shutil.rmtree, volume, ignore_errors=True)
+        appliance.configure(f'volumes="{volume}"\nvolumes_folders="yes"\n')
         self.sid = self.log_in("normal")
 
     def write(self, name, content=b"content"):
