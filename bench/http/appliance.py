@@ -41,6 +41,11 @@ def add_account(root):
                    text=True, check=True, stdout=subprocess.DEVNULL)
 
 
+def write_settings(root):
+    """What an appliance is set up with: a settings file is there, whatever it says."""
+    (root / "etc/talo/host.conf").write_text('session_timeout="30"\n', encoding="utf-8")
+
+
 class Appliance:
     """Behind a web server, in one mode: "cgi" or "warm"."""
 

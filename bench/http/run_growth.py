@@ -18,7 +18,7 @@ import fit  # noqa: E402
 import plot  # noqa: E402
 import wrk  # noqa: E402
 from appliance import (ENTRY, HOST, INFO, PROJECT, Appliance, add_account,  # noqa: E402
-                       has_warm_mode, install_module)
+                       has_warm_mode, install_module, write_settings)
 from mounts import in_own_mounts, root_of  # noqa: E402
 from table import markdown, number, seconds  # noqa: E402
 
@@ -256,6 +256,7 @@ def main():
     in_own_mounts(__file__, root, build)
     warning = document.load_warning()
     add_account(root)
+    write_settings(root)
     install_module(root, build)
     options.mode = options.mode or ("warm" if has_warm_mode(root) else "cgi")
     appliance = Appliance(root, build / "run/bench-growth", options.server, options.mode)

@@ -13,7 +13,7 @@ import document  # noqa: E402
 import plot  # noqa: E402
 import wrk  # noqa: E402
 from appliance import (ENTRY, HOST, INFO, ONCE, PROJECT, Appliance, add_account,  # noqa: E402
-                       ask, has_warm_mode, install_module)
+                       ask, has_warm_mode, install_module, write_settings)
 from mounts import in_own_mounts, root_of  # noqa: E402
 from peers import Peers  # noqa: E402
 from table import markdown, number  # noqa: E402
@@ -69,6 +69,7 @@ class Field:
         self.subjects = []
         self.warm = []
         add_account(root)
+        write_settings(root)
         install_module(root, build)
         try:
             for server in servers:

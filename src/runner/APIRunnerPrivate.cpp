@@ -11,9 +11,34 @@ namespace TALO {
 
 namespace {
 
+// What the last runner left in the argument vector: the start name, cut by one
+// character where it had no more room. A process with many requests, one runner
+// each, would else forget a piece of its name, and of its room, with each.
+struct Left {
+    char* argument;
+    unsigned room;
+    char shown[256];
+    char startName[256];
+};
+Left left = {};
+
+bool ShowsWhatWasLeft(const char* text) {
+    return left.shown[0] != '\0' && strcmp(text, left.shown) == 0;
+}
+
+// Whether the system would tell of nothing else: what it shows is what the first
+// argument holds.
+bool ShowsStartName() {
+    return left.argument != nullptr && left.argument == program_invocation_name &&
+           ShowsWhatWasLeft(left.argument);
+}
+
 // The base name of the program as it was started, before anybody renamed it.
 // Reading ends at a blank: arguments that were joined into one are left out.
 std::string StartName() {
+    if (ShowsStartName()) {
+        return left.startName;
+    }
     const int commandLine = open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
     if (commandLine < 0) {
         return program_invocation_short_name;
@@ -29,21 +54,6 @@ std::string StartName() {
     }
     (void)close(commandLine);
     return basename(text.substr(0, end).c_str());
-}
-
-// What the last runner left in the argument vector: the start name, cut by one
-// character where it had no more room. A process with many requests, one runner
-// each, would else forget a piece of its name, and of its room, with each.
-struct Left {
-    char* argument;
-    unsigned room;
-    char shown[256];
-    char startName[256];
-};
-Left left = {};
-
-bool ShowsWhatWasLeft(const char* text) {
-    return left.shown[0] != '\0' && strcmp(text, left.shown) == 0;
 }
 
 }  // namespace

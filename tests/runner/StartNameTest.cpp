@@ -55,4 +55,23 @@ TEST(StartName, IsTheCLibrarysWhenTheArgumentsCannotBeRead) {
     });
 }
 
+// A process with many requests asks the system for the first of them.
+TEST(StartName, IsRememberedWhileTheArgumentShowsIt) {
+    runner::InChild([] {
+        char known[] = "known-to-libc";
+        char* own = probe::Arguments()[0];
+        ASSERT_EQ(own, program_invocation_name);
+        APIRunnerPrivate first(nullptr);
+        const std::string start = first.origProcName;
+        first.SetArgs(1, &own);
+        first.SetArgv0(start);
+        first.LeaveArgv0();
+        program_invocation_short_name = known;
+        probe::RefuseSystemCall(SYS_openat, EACCES);
+        EXPECT_EQ(APIRunnerPrivate(nullptr).origProcName, start);
+        own[0] = own[0] == 'x' ? 'y' : 'x';
+        EXPECT_EQ(APIRunnerPrivate(nullptr).origProcName, "known-to-libc");
+    });
+}
+
 }  // namespace
