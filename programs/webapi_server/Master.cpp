@@ -87,6 +87,8 @@ bool Master::Run() {
             workers_.Grow(now_);
         }
     }
+    templates_.EndAll();
+    ReapChildren();
     syslog(LOG_NOTICE, "ended");
     return true;
 }
@@ -188,6 +190,7 @@ void Master::ReapChildren() {
     int status = 0;
     for (pid_t pid = 0; (pid = waitpid(-1, &status, WNOHANG)) > 0;) {
         workers_.OnOrphan(pid, status);
+        templates_.OnChildEnded(pid);
     }
 }
 

@@ -2,6 +2,7 @@
 
 #include <signal.h>
 #include <sys/socket.h>
+#include <sys/wait.h>
 #include <syslog.h>
 #include <unistd.h>
 
@@ -16,6 +17,7 @@ constexpr long long kMostPending = 20000;
 constexpr long long kSoundLife = 10000;
 constexpr long long kFirstPause = 100;
 constexpr int kMostDoublings = 7;
+constexpr long long kMostEnding = 2000;
 
 }  // namespace
 
@@ -171,6 +173,33 @@ void Templates::Retire(Handle& handle) {
     }
 }
 
+void Templates::OnChildEnded(pid_t pid) {
+    leaving_.erase(std::remove(leaving_.begin(), leaving_.end(), pid), leaving_.end());
+}
+
+bool Templates::HaveLeft() {
+    const auto isGone = [](pid_t pid) { return waitpid(pid, nullptr, WNOHANG) != 0; };
+    leaving_.erase(std::remove_if(leaving_.begin(), leaving_.end(), isGone), leaving_.end());
+    return leaving_.empty();
+}
+
+// One that is loading notices only when it has done so.
+void Templates::EndAll() {
+    for (Handle& handle : all_) {
+        if (handle.state != State::kNone) {
+            handle.pending = 0;
+            Retire(handle);
+        }
+    }
+    const long long end = MillisecondsNow() + kMostEnding;
+    while (!HaveLeft() && MillisecondsNow() < end) {
+        (void)usleep(1000);
+    }
+    for (const pid_t late : leaving_) {
+        (void)kill(late, SIGKILL);
+    }
+}
+
 void Templates::End(Handle& handle, long long now) {
     const bool wasPreparing = handle.state == State::kPreparing;
     const bool wasCurrent = handle.state == State::kCurrent;
@@ -190,6 +219,9 @@ void Templates::Drop(Handle& handle) {
     if (handle.control >= 0) {
         poller_.Remove(handle.control);
         (void)close(handle.control);
+    }
+    if (handle.pid > 0) {
+        leaving_.push_back(handle.pid);
     }
     handle = Handle();
 }

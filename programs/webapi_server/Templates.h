@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <array>
+#include <vector>
 
 #include "programs/webapi_server/Message.h"
 #include "programs/webapi_server/Poller.h"
@@ -46,6 +47,12 @@ class Templates {
     void OnMessage(const Event& event, long long now);
     void Tick(long long now);
 
+    // A child of this process has ended, and was waited for.
+    void OnChildEnded(pid_t pid);
+
+    // Ends all of them, and waits until they are gone.
+    void EndAll();
+
   private:
     enum class State { kNone, kPreparing, kCurrent, kRetiring };
     struct Handle {
@@ -67,6 +74,7 @@ class Templates {
     void Retire(Handle& handle);
     void End(Handle& handle, long long now);
     void Drop(Handle& handle);
+    bool HaveLeft();
 
     const Poller& poller_;
     SlotTable& slots_;
@@ -74,6 +82,7 @@ class Templates {
     const OriginalProcess& original_;
     TemplateEvents& events_;
     std::array<Handle, 8> all_;
+    std::vector<pid_t> leaving_;  // dropped, but not gone yet
     int generation_ = 0;
     unsigned serial_ = 0;
     bool isWanted_ = false;  // a new one

@@ -1,6 +1,8 @@
 """webapi-server as a process: what web servers get of it, whatever becomes of its parts."""
 
 import contextlib
+import ctypes
+import functools
 import os
 import random
 import signal
@@ -256,6 +258,18 @@ class Signals(scgi_server.ServerTest):
             server.send_signal(signal.SIGTERM)
             self.assertEqual(server.wait(LONG), 0)
             self.assertFalse(os.path.exists(path))
+
+    def test_leaves_no_process_when_it_ends(self):
+        take_orphans = functools.partial(ctypes.CDLL(None).prctl, 36)  # as a subreaper
+        self.assertEqual(take_orphans(1), 0)
+        self.addCleanup(take_orphans, 0)
+        for number in range(5):
+            server = self.start(socket_path=os.path.join(self.folder, f"short-{number}"))
+            self.echo()
+            server.send_signal(signal.SIGHUP)
+            server.send_signal(signal.SIGTERM)
+            self.assertEqual(server.wait(LONG), 0)
+            self.assertRaises(ChildProcessError, os.waitpid, -1, os.WNOHANG)
 
     def test_ends_at_once_when_told_twice(self):
         server = self.start("--min-workers", "1")
