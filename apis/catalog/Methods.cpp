@@ -11,6 +11,20 @@ using TALO::APIRunner;
 
 namespace {
 
+// Reads each description once, for the methods' attributes too.
+class Descriptions : public APIRunner {
+  public:
+    const Json::Value& ReadAll() {
+        (void)InitLibDesc(libDesc);
+        return libDesc;
+    }
+
+    // Null when there is none of that name.
+    const Json::Value* Read(const std::string& name) {
+        return InitLibDesc(libDesc, name) != 0 && libDesc.isMember(name) ? &libDesc[name] : nullptr;
+    }
+};
+
 // An entry of a version's list names a method as a text, or as the members of
 // an object.
 std::vector<std::string> NamesOf(const Json::Value& entry) {
@@ -73,18 +87,15 @@ Json::Value Entry(APIRunner& runner, const std::string& name, const Json::Value&
 }
 
 void List(APIRequest* request, APIResponse* response) {
-    APIRunner runner;
-    Json::Value descriptions(Json::objectValue);
-    (void)runner.InitLibDesc(descriptions);
-    const Json::Value& known = descriptions;
-    Json::Value apis(Json::arrayValue);
-    for (auto description = known.begin(); description != known.end(); ++description) {
+    Descriptions known;
+    const Json::Value& all = known.ReadAll();
+    Json::Value data(Json::objectValue);
+    Json::Value& apis = data["apis"] = Json::Value(Json::arrayValue);
+    for (auto description = all.begin(); description != all.end(); ++description) {
         if (MayCall(*request, *description)) {
-            apis.append(Entry(runner, description.name(), *description));
+            apis.append(Entry(known, description.name(), *description));
         }
     }
-    Json::Value data(Json::objectValue);
-    data["apis"] = apis;
     response->SetSuccess(data);
 }
 
@@ -95,13 +106,11 @@ void Describe(APIRequest* request, APIResponse* response) {
         response->SetError(kBadParameter, "name");
         return;
     }
-    APIRunner runner;
-    Json::Value descriptions(Json::objectValue);
-    const bool loaded = runner.InitLibDesc(descriptions, name.Get()) != 0;
-    const Json::Value& known = descriptions;
-    if (!loaded || !known.isMember(name.Get()) || !MayCall(*request, known[name.Get()])) {
+    Descriptions known;
+    const Json::Value* const description = known.Read(name.Get());
+    if (description == nullptr || !MayCall(*request, *description)) {
         response->SetError(kNoSuchAPI, name.Get());
         return;
     }
-    response->SetSuccess(Entry(runner, name.Get(), known[name.Get()]));
+    response->SetSuccess(Entry(known, name.Get(), *description));
 }

@@ -87,7 +87,7 @@ class Growths:
     def _settle(self):
         """A server that watches the folder may take a moment to see what is new."""
         if self._options.mode == "warm":
-            time.sleep(2)
+            time.sleep(6)
         self._appliance.get(INFO, self._sid)
 
     def parameters(self):

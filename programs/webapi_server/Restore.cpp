@@ -4,6 +4,7 @@
 #include <fcntl.h>
 #include <grp.h>
 #include <locale.h>
+#include <malloc.h>
 #include <string.h>
 #include <sys/prctl.h>
 #include <sys/time.h>
@@ -176,6 +177,11 @@ ProcessState::Told ProcessState::Tell() const {
 
 long long ProcessState::PrivateKiB() const {
     return status_.Number("RssAnon");
+}
+
+void ProcessState::ReturnMemory() {
+    (void)malloc_trim(0);
+    (void)status_.Read();
 }
 
 // What the system tells as before is as before; the rest is looked at one by one.

@@ -36,6 +36,9 @@ class ProcessState {
     // there before a fork included. -1 when the system does not tell.
     long long PrivateKiB() const;
 
+    // Gives what is free of it back to the system, which takes a while.
+    void ReturnMemory();
+
   private:
     // As the system writes them.
     struct Told {

@@ -158,6 +158,7 @@ class Worker {
     bool Run();
     bool PutBack();
     bool MayGoOn();
+    bool IsSlim();
 
     const int control_;
     Slot* const slot_;
@@ -260,8 +261,15 @@ bool Worker::PutBack() {
 
 bool Worker::MayGoOn() {
     ++served_;
-    return served_ < settings_.workerRequests && MillisecondsNow() < end_ &&
-           state_.PrivateKiB() <= mostMemory_;
+    return served_ < settings_.workerRequests && MillisecondsNow() < end_ && IsSlim();
+}
+
+// A large request leaves much that is free.
+bool Worker::IsSlim() {
+    if (state_.PrivateKiB() > mostMemory_) {
+        state_.ReturnMemory();
+    }
+    return state_.PrivateKiB() <= mostMemory_;
 }
 
 }  // namespace

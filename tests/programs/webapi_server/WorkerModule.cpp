@@ -5,8 +5,11 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <iostream>
+#include <memory>
 #include <string>
+#include <vector>
 
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
@@ -35,6 +38,19 @@ void Variable(APIRequest* request, APIResponse* response) {
     response->SetSuccess(value != nullptr ? Json::Value(value) : Json::Value());
 }
 
+// Frees as much as it allocates, but for the last little piece: below it the heap
+// does not shrink by itself.
+void LeaveHoles() {
+    constexpr size_t kSize = 4096;
+    std::vector<std::unique_ptr<char[]>> pieces(size_t{10} * 1024);
+    for (auto& piece : pieces) {
+        piece.reset(new char[kSize]);
+        memset(piece.get(), 'x', kSize);
+    }
+    auto* const last = static_cast<volatile char*>(malloc(kSize));
+    last[0] = 'x';
+}
+
 void Leave(APIRequest* request, APIResponse* response) {
     const std::string what = Text(request, "what");
     if (what == "folder") {
@@ -51,6 +67,8 @@ void Leave(APIRequest* request, APIResponse* response) {
         for (size_t at = 0; at < kSize; at += 1024) {
             left[at] = 'x';
         }
+    } else if (what == "holes") {
+        LeaveHoles();
     }
     response->SetSuccess(what);
 }

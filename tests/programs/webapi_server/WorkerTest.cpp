@@ -300,6 +300,19 @@ TEST_F(WorkerLife, EndsWhenItHasGrown) {
     EXPECT_LT(calls, 6);
 }
 
+// A sanitizer keeps what was freed.
+TEST_F(WorkerLife, GoesOnWhenWhatItHasGrownByIsFree) {
+#if defined(__SANITIZE_ADDRESS__)
+    constexpr bool isFreed = false;
+#else
+    constexpr bool isFreed = true;
+#endif
+    settings_.workerGrowthKiB = 16 * 1024;
+    Start();
+    EXPECT_TRUE(Body(Call("leave", "what=holes"))["success"].asBool());
+    EXPECT_EQ(SaysIdle(), isFreed);
+}
+
 TEST_F(WorkerLife, EndsAtItsAge) {
     settings_.workerSeconds = 0;
     Start();
