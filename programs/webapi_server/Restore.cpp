@@ -94,7 +94,7 @@ std::vector<pid_t> Children() {
 // Background tasks and callbacks have a session of their own. A callback's process may
 // be so young that it has none yet.
 bool IsDetached(pid_t child) {
-    constexpr int kMostMilliseconds = 100;
+    constexpr int kMostMilliseconds = 3000;
     for (int waited = 0; waited < kMostMilliseconds; ++waited) {
         const pid_t session = getsid(child);
         if (session == child || session < 0) {
