@@ -282,12 +282,13 @@ class Stop(TaskTest):
 
     def test_lets_the_work_leave_a_result(self):
         sid = self.log_in("normal")
-        task_id = self.start(sid, seconds=60, graceful=True)
+        # The same of both: either the work or the stop may be the last to finish it.
+        task_id = self.start(sid, seconds=60, graceful=True, auto_remove=False)
         self.assertEqual(task("stop", sid, task_id=task_id).code, 0)
         self.assertTrue(wait_until(lambda: not lives(self.pids[-1])))
         status = self.status(sid, task_id)
-        # "auto_remove" is of whoever was the last to finish it: the work or the stop.
         self.assertEqual((status["data"]["state"], status["finish"]), ("stopped", True))
+        self.assertIs(status["auto_remove"], False)
 
     def test_may_be_asked_twice(self):
         sid = self.log_in("normal")
