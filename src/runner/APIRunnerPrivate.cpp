@@ -33,12 +33,9 @@ bool ShowsStartName() {
            ShowsWhatWasLeft(left.argument);
 }
 
-// The base name of the program as it was started, before anybody renamed it.
-// Reading ends at a blank: arguments that were joined into one are left out.
-std::string StartName() {
-    if (ShowsStartName()) {
-        return left.startName;
-    }
+// The base name of the program as the system shows it. Reading ends at a blank:
+// arguments that were joined into one are left out.
+std::string ReadStartName() {
     const int commandLine = open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
     if (commandLine < 0) {
         return program_invocation_short_name;
@@ -54,6 +51,29 @@ std::string StartName() {
     }
     (void)close(commandLine);
     return basename(text.substr(0, end).c_str());
+}
+
+// What was read when the first argument held this text. It is what the system shows.
+struct Read {
+    const char* argument;
+    char text[256];
+    std::string startName;
+};
+
+// The base name of the program as it was started, before anybody renamed it.
+std::string StartName() {
+    if (ShowsStartName()) {
+        return left.startName;
+    }
+    static Read last = {};
+    const char* const argument = program_invocation_name;
+    if (argument != last.argument || strcmp(argument, last.text) != 0) {
+        last.startName = ReadStartName();
+        const bool fits = strlen(argument) < sizeof last.text;
+        last.argument = fits ? argument : nullptr;
+        (void)snprintf(last.text, sizeof last.text, "%s", argument);
+    }
+    return last.startName;
 }
 
 }  // namespace
