@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <fcntl.h>
+#include <signal.h>
 #include <string.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
@@ -23,6 +24,15 @@ const struct sockaddr* Generic(const struct sockaddr_un* address) {
     return reinterpret_cast<const struct sockaddr*>(address);
 }
 
+// The workers of a server that was killed may keep its socket open for a moment; the
+// system knows who listened first.
+bool HasListenerGone(int connection) {
+    struct ucred peer = {};
+    socklen_t size = sizeof peer;
+    return getsockopt(connection, SOL_SOCKET, SO_PEERCRED, &peer, &size) == 0 && peer.pid > 0 &&
+           kill(peer.pid, 0) != 0 && errno == ESRCH;
+}
+
 // Removes a socket that was left behind. False when what is there must stay.
 bool MakeRoom(const struct sockaddr_un& address, std::string* problem) {
     struct stat facts = {};
@@ -33,9 +43,10 @@ bool MakeRoom(const struct sockaddr_un& address, std::string* problem) {
         return Fail(problem, address.sun_path, "is there, and is no socket");
     }
     const int probe = NewSocket();
-    const bool isStale = probe >= 0 && connect(probe, Generic(&address), sizeof address) != 0 &&
-                         errno == ECONNREFUSED;
+    bool isStale = false;
     if (probe >= 0) {
+        isStale = connect(probe, Generic(&address), sizeof address) == 0 ? HasListenerGone(probe)
+                                                                         : errno == ECONNREFUSED;
         (void)close(probe);
     }
     if (!isStale) {

@@ -17,6 +17,7 @@ namespace {
 
 constexpr int kMostEvents = 64;
 constexpr int kMostAccepted = 64;  // in one go
+constexpr int kMostCounted = 1024;
 constexpr long long kTick = 100;
 constexpr long long kIdleTick = 1000;
 constexpr long long kAcceptPause = 100;
@@ -46,8 +47,8 @@ Master::Master(Listener& listener, const Settings& settings, const OriginalProce
       slots_(2 * settings.maxWorkers),
       queue_(settings.queue),
       farewell_(poller_),
-      workers_(poller_, slots_, settings, queue_, farewell_),
-      templates_(poller_, slots_, settings, original, workers_),
+      workers_(poller_, taken_, slots_, settings, queue_, farewell_),
+      templates_(poller_, {listener, taken_, slots_, settings, original}, workers_),
       now_(MillisecondsNow()) {
     workers_.SetTemplates(&templates_);
 }
@@ -86,6 +87,7 @@ bool Master::Run() {
         if (drainUntil_ == 0 || queue_.Size() > 0) {
             workers_.Grow(now_);
         }
+        ShareClients();
     }
     templates_.EndAll();
     ReapChildren();
@@ -96,13 +98,33 @@ bool Master::Run() {
 bool Master::Begin() {
     const sigset_t signals = SignalsOfMaster();
     signals_ = signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK);
-    isAccepting_ = signals_ >= 0 && slots_.IsMapped() &&
-                   poller_.Add(signals_, {Source::kSignals, 0, 0}) &&
-                   poller_.Add(listener_.Get(), {Source::kListener, 0, 0});
-    if (isAccepting_) {
+    isAccepting_ = signals_ >= 0 && slots_.IsMapped() && taken_.IsOpen() &&
+                   poller_.Add(signals_, {Source::kSignals, 0, 0});
+    WatchClients(isAccepting_);
+    if (isWatching_) {
         templates_.Reload("start", now_);
     }
-    return isAccepting_;
+    return isWatching_;
+}
+
+void Master::WatchClients(bool wanted) {
+    if (wanted && !isWatching_) {
+        isWatching_ = poller_.Add(listener_.Get(), {Source::kListener, 0, 0});
+    } else if (!wanted && isWatching_) {
+        poller_.Remove(listener_.Get());
+        isWatching_ = false;
+    }
+}
+
+// While the processors have enough to do, who connects waits in the socket for the
+// next worker that is done, and nobody is woken. As soon as one finds nobody there,
+// or is not done for some time, the master looks at the socket again.
+void Master::ShareClients() {
+    if (!isWatching_) {
+        workers_.ReadTaken(now_);
+        WatchClients(isAccepting_ && workers_.MayBegin(now_));
+    }
+    workers_.LetTake(isAccepting_ && !isWatching_ && queue_.Size() == 0);
 }
 
 void Master::Handle(const Event& event) {
@@ -129,7 +151,17 @@ void Master::Handle(const Event& event) {
 }
 
 void Master::Accept() {
+    if (!workers_.MayBegin(now_)) {
+        WatchClients(false);
+        return;
+    }
     for (int count = 0; isAccepting_ && count < kMostAccepted && AcceptOne(); ++count) {
+    }
+}
+
+// Those in the socket can only be counted by taking them.
+void Master::CountClients() {
+    for (int count = 0; isAccepting_ && count < kMostCounted && AcceptOne(); ++count) {
     }
 }
 
@@ -147,8 +179,8 @@ bool Master::AcceptOne() {
     if (errno == EMFILE || errno == ENFILE || errno == ENOMEM || errno == ENOBUFS) {
         // Who waits stays in the socket's own queue until there is something to spare.
         syslog(LOG_ERR, "cannot accept: %m");
-        poller_.Remove(listener_.Get());
         isAccepting_ = false;
+        WatchClients(false);
         acceptNotBefore_ = now_ + kAcceptPause;
     }
     return errno == ECONNABORTED || errno == EINTR;
@@ -207,8 +239,9 @@ void Master::StartDraining() {
         while (isAccepting_ && AcceptOne()) {
         }
     }
-    poller_.Remove(listener_.Get());
     isAccepting_ = false;
+    WatchClients(false);
+    workers_.LetTake(false);
     listener_.Close();
 }
 
@@ -234,14 +267,17 @@ void Master::Tick() {
     templates_.Tick(now_);
     farewell_.Tick(now_);
     if (!isAccepting_ && drainUntil_ == 0 && now_ >= acceptNotBefore_) {
-        isAccepting_ = poller_.Add(listener_.Get(), {Source::kListener, 0, 0});
+        isAccepting_ = true;
+    }
+    if (!isWatching_) {
+        CountClients();
     }
 }
 
 int Master::MillisecondsToWait() const {
     const bool isQuiet = !workers_.AreBusy() && queue_.Size() == 0 && farewell_.IsEmpty() &&
                          drainUntil_ == 0 && isAccepting_ && templates_.Generation() != 0;
-    if (queue_.Size() > 0 && workers_.HaveIdle()) {
+    if ((isAccepting_ && !isWatching_) || (queue_.Size() > 0 && workers_.HaveIdle())) {
         return kLookAgain;
     }
     const long long until = isQuiet ? nextTick_ - kTick + kIdleTick : nextTick_;

@@ -10,8 +10,9 @@
 // was there.
 void HoldSignals(sigset_t* before);
 
-// The process that supervises: accepts every connection, hands it to a worker or
-// lets it wait, and answers in place of a worker that cannot. It reads no request and
+// The process that supervises: hands connections to workers or lets them wait, while
+// there is much to do leaves it to workers to take the next, and answers in place of a
+// worker that cannot. It reads no request and
 // loads no API library. One thread, which waits for nobody in particular.
 class Master {
   public:
@@ -27,7 +28,10 @@ class Master {
   private:
     bool Begin();
     void Handle(const Event& event);
+    void WatchClients(bool wanted);
+    void ShareClients();
     void Accept();
+    void CountClients();
     bool AcceptOne();
     void Refuse(int connection);
     void HandOut();
@@ -40,6 +44,7 @@ class Master {
 
     Listener& listener_;
     Poller poller_;
+    TakenChannel taken_;
     SlotTable slots_;
     ConnectionQueue queue_;
     Farewell farewell_;
@@ -49,6 +54,7 @@ class Master {
     long long now_;
     long long nextTick_ = 0;
     bool isAccepting_ = false;
+    bool isWatching_ = false;  // for clients; otherwise workers take them
     bool hasClients_ = false;  // to accept
     long long acceptNotBefore_ = 0;
     long long drainUntil_ = 0;  // 0: goes on

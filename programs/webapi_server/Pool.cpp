@@ -48,6 +48,10 @@ void Pool::Free(int index) {
     At(index).serial = 0;
 }
 
+void Pool::BeginAnother(int index, long long since) {
+    At(index).since = std::max(At(index).since, since);
+}
+
 int Pool::ChooseIdle() const {
     if (Count(WorkerState::kIdle) == 0) {
         return -1;

@@ -60,6 +60,9 @@ class Pool {
     void SetState(int index, WorkerState state, long long now);
     void Free(int index);
 
+    // A busy one has gone on with another request since then.
+    void BeginAnother(int index, long long since);
+
     // The one that was idle for the shortest time, of the newest generation: it has
     // the most of its memory at hand, and the others can leave. -1 when none is.
     int ChooseIdle() const;

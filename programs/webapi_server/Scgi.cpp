@@ -77,9 +77,16 @@ ScgiResult Malformed(std::string* reason, const char* text) {
     return ScgiResult::kMalformed;
 }
 
-// The length in front of the block. What is looked at ahead is taken only as far
-// as it belongs to the length, so that the next look waits for new bytes.
-ScgiResult ReadLength(Source* source, size_t limit, size_t* length, std::string* reason) {
+// How much to take for the rest of the length's text, the block and its comma, of
+// which the first bytes are not of the block.
+struct Frame {
+    size_t size;
+    size_t lead;
+};
+
+// The length in front of the block is looked at ahead. Where more of it has to come,
+// what is there is taken, so that the next look waits for new bytes.
+ScgiResult ReadLength(Source* source, size_t limit, Frame* frame, std::string* reason) {
     size_t value = 0;
     size_t digits = 0;
     bool zero = false;
@@ -107,14 +114,14 @@ ScgiResult ReadLength(Source* source, size_t limit, size_t* length, std::string*
         if (ended && (ahead[used] != ':' || digits == 0)) {
             return Malformed(reason, "the block's length is no number");
         }
-        used += ended ? 1 : 0;
+        if (ended) {
+            frame->lead = used + 1;
+            frame->size = frame->lead + value + 1;
+            return ScgiResult::kRead;
+        }
         if (source->Take(ahead, used, 0, &result, reason) != used) {
             return result == ScgiResult::kRead ? Malformed(reason, "somebody else reads along")
                                                : result;
-        }
-        if (ended) {
-            *length = value;
-            return ScgiResult::kRead;
         }
     }
 }
@@ -218,12 +225,12 @@ ScgiResult ParseBlock(const std::string& block, std::vector<std::string>* variab
 ScgiResult ReadScgiRequest(int connection, const ScgiLimits& limits,
                            std::vector<std::string>* variables, std::string* reason) {
     Source source(connection, limits.milliseconds);
-    size_t length = 0;
-    ScgiResult result = ReadLength(&source, limits.headerBytes, &length, reason);
+    Frame frame = {};
+    ScgiResult result = ReadLength(&source, limits.headerBytes, &frame, reason);
     if (result != ScgiResult::kRead) {
         return result;
     }
-    std::string block(length + 1, '\0');
+    std::string block(frame.size, '\0');
     for (size_t have = 0; have < block.size();) {
         const size_t count = source.Take(&block[have], block.size() - have, 0, &result, reason);
         if (count == 0) {
@@ -235,5 +242,6 @@ ScgiResult ReadScgiRequest(int connection, const ScgiLimits& limits,
         return Malformed(reason, "no comma follows the block");
     }
     block.pop_back();
+    block.erase(0, frame.lead);
     return ParseBlock(block, variables, reason);
 }

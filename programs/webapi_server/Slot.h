@@ -7,7 +7,8 @@
 #include <atomic>
 
 // What a worker shows to the master, in memory that both map. The worker writes,
-// the master reads, except that the master clears a slot before it gives it away.
+// the master reads, except that the master clears a slot before it gives it away,
+// and that `mayTake` is the master's.
 struct Slot {
     std::atomic<pid_t> pid;
     std::atomic<long long> began;       // of the request, CLOCK_MONOTONIC ms; 0 when idle
@@ -15,11 +16,20 @@ struct Slot {
     std::atomic<int> transfers;         // 1: an upload or a download; progress extends the limit
     volatile sig_atomic_t answerBegun;  // the first byte of the reply is about to leave
     char api[128];                      // zero-terminated, for the log
+    std::atomic<int> mayTake;           // 1: when done, a worker may take who connects by itself
+    std::atomic<long long> takenAt;     // when it last did, CLOCK_MONOTONIC ms
 };
 
 // The control socket (SOCK_SEQPACKET) between the two. The master sends kServe with
 // the connection as its ancillary descriptor, or kLeave; the worker sends kIdle when
 // it is ready for another request. A worker that ends just closes its side.
 enum ControlMessage : char { kServe = 's', kLeave = 'l', kIdle = 'i' };
+
+// What a worker that took a connection by itself tells the master, with the connection
+// as ancillary descriptor. All workers tell it over one socket (SOCK_SEQPACKET).
+struct TakenReport {
+    int slot;
+    unsigned serial;
+};
 
 #endif

@@ -7,6 +7,7 @@
 #include <poll.h>
 #include <stdlib.h>
 #include <sys/signalfd.h>
+#include <sys/socket.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <syslog.h>
@@ -26,20 +27,9 @@
 
 namespace {
 
-constexpr int kControl = 3;
 constexpr int kLookMilliseconds = 1000;
 // A file that was written just before cannot be kept in memory at first.
 constexpr int kSettleMilliseconds = 2500;
-
-// Of the connections and sockets that the master had at the fork, the template
-// keeps none.
-void KeepOnly(int descriptor) {
-    closelog();
-    if (descriptor != kControl) {
-        (void)dup3(descriptor, kControl, O_CLOEXEC);
-    }
-    (void)close_range(kControl + 1, ~0U, 0);
-}
 
 // A library that is named without a folder is where the loader found it.
 std::string PlaceOf(void* handle, const std::string& path) {
@@ -85,7 +75,7 @@ void Load(bool loadsLibraries, Changes* changes) {
 }
 
 bool Tell(const TemplateReport& report, int descriptor = -1) {
-    return SendMessage(kControl, &report, sizeof report, descriptor, 0);
+    return SendMessage(kControlSocket, &report, sizeof report, descriptor, 0);
 }
 
 // Where the master went without reading everything, the system tells of that before
@@ -93,7 +83,7 @@ bool Tell(const TemplateReport& report, int descriptor = -1) {
 ssize_t ReceiveOrder(StartOrder* order, int* workerControl) {
     ssize_t got = -1;
     do {
-        got = ReceiveMessage(kControl, order, sizeof *order, workerControl, 0);
+        got = ReceiveMessage(kControlSocket, order, sizeof *order, workerControl, 0);
     } while (got < 0 && errno == ECONNRESET);
     return got;
 }
@@ -115,7 +105,7 @@ class Nursery {
     void ReportEnded();
 
   private:
-    [[noreturn]] void BecomeWorker(int slot, int control);
+    [[noreturn]] void BecomeWorker(const StartOrder& order, int control);
 
     const TemplateTask& task_;
     std::vector<StartedWorker> started_;
@@ -124,7 +114,7 @@ class Nursery {
 bool Nursery::Start(const StartOrder& order, int workerControl) {
     const pid_t pid = fork();
     if (pid == 0) {
-        BecomeWorker(order.slot, workerControl);
+        BecomeWorker(order, workerControl);
     }
     (void)close(workerControl);
     if (pid < 0) {
@@ -144,18 +134,20 @@ bool Nursery::Start(const StartOrder& order, int workerControl) {
     return told;
 }
 
-void Nursery::BecomeWorker(int slot, int control) {
+void Nursery::BecomeWorker(const StartOrder& order, int control) {
     // What it starts and does not detach can be ended with it.
     (void)setpgid(0, 0);
-    KeepOnly(control);
+    KeepOnly({control, kListenerSocket, kTakenSocket});
     const TemplateTask task = task_;
-    task.slots->KeepOnly(slot);
+    task.slots->KeepOnly(order.slot);
     (void)setrlimit(RLIMIT_NOFILE, &task.original->files);
     (void)sigprocmask(SIG_SETMASK, &task.original->mask, nullptr);
-    Slot* const shared = task.slots->At(slot);
-    shared->pid = getpid();
+    Slot* const slot = task.slots->At(order.slot);
+    slot->pid = getpid();
+    const WorkerTask worker = {
+        kControlSocket, kListenerSocket, kTakenSocket, {order.slot, order.serial}, slot};
     // Not _exit: the end of a process is part of what a library may rely on.
-    exit(RunWorker(kControl, shared, *task.settings));
+    exit(RunWorker(worker, *task.settings));
 }
 
 void Nursery::ReportEnded() {
@@ -179,6 +171,18 @@ int OpenChildSignals() {
     return signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK);
 }
 
+// Nobody accepts any more: who waits, or comes while a worker that has a request
+// keeps the socket open, must learn that.
+void CloseListener(bool ends) {
+    if (ends) {
+        (void)shutdown(kListenerSocket, SHUT_RDWR);
+        for (int late = -1; (late = accept(kListenerSocket, nullptr, nullptr)) >= 0;) {
+            (void)close(late);
+        }
+    }
+    (void)close(kListenerSocket);
+}
+
 void Forget(int signals) {
     struct signalfd_siginfo read_ = {};
     while (read(signals, &read_, sizeof read_) > 0) {
@@ -190,7 +194,7 @@ void Forget(int signals) {
 void RunTemplate(const TemplateTask& task) {
     // A terminal's signals are for the master.
     (void)setsid();
-    KeepOnly(task.control);
+    KeepOnly(task.sockets);
     if (chdir(TALO_WEBAPI_DIR) != 0) {
         syslog(LOG_ERR, "%s: %m", TALO_WEBAPI_DIR);
     }
@@ -203,7 +207,7 @@ void RunTemplate(const TemplateTask& task) {
     }
     long long settled = MillisecondsNow() + kSettleMilliseconds;
     for (long long nextLook = MillisecondsNow() + kLookMilliseconds;;) {
-        struct pollfd waits[] = {{kControl, POLLIN, 0}, {signals, POLLIN, 0}};
+        struct pollfd waits[] = {{kControlSocket, POLLIN, 0}, {signals, POLLIN, 0}};
         const long long left = nextLook - MillisecondsNow();
         (void)poll(waits, 2, static_cast<int>(std::max(left, 0LL)));
         if (MillisecondsNow() >= nextLook) {
@@ -231,6 +235,7 @@ void RunTemplate(const TemplateTask& task) {
         }
         if (got != sizeof order || !nursery.Start(order, workerControl)) {
             // The master is gone: whom it replaces it tells to end.
+            CloseListener(task.endsListener);
             WatchOrphans(*task.slots);
             _exit(EXIT_SUCCESS);
         }

@@ -6,6 +6,7 @@
 
 #include "programs/webapi_server/Settings.h"
 #include "programs/webapi_server/SlotTable.h"
+#include "programs/webapi_server/Sockets.h"
 
 // What workers get back of what the master changed for itself.
 struct OriginalProcess {
@@ -14,7 +15,8 @@ struct OriginalProcess {
 };
 
 struct TemplateTask {
-    int control;  // to the master
+    Sockets sockets;
+    bool endsListener;  // with the master: nobody else has it
     SlotTable* slots;
     const Settings* settings;
     const OriginalProcess* original;

@@ -21,9 +21,8 @@ constexpr long long kMostEnding = 2000;
 
 }  // namespace
 
-Templates::Templates(const Poller& poller, SlotTable& slots, const Settings& settings,
-                     const OriginalProcess& original, TemplateEvents& events)
-    : poller_(poller), slots_(slots), settings_(settings), original_(original), events_(events) {}
+Templates::Templates(const Poller& poller, const Inherited& inherited, TemplateEvents& events)
+    : poller_(poller), inherited_(inherited), events_(events) {}
 
 Templates::~Templates() {
     for (Handle& handle : all_) {
@@ -134,7 +133,12 @@ void Templates::Launch(long long now) {
     const bool loadsLibraries = !libraryFailed_;
     const pid_t pid = fork();
     if (pid == 0) {
-        RunTemplate({ends[1], &slots_, &settings_, &original_, loadsLibraries});
+        RunTemplate({{ends[1], inherited_.listener.Get(), inherited_.taken.WorkersEnd()},
+                     inherited_.listener.IsOwn(),
+                     &inherited_.slots,
+                     &inherited_.settings,
+                     &inherited_.original,
+                     loadsLibraries});
     }
     (void)close(ends[1]);
     *handle = {State::kPreparing, pid,           ends[0], ++generation_, 0, 0, now,

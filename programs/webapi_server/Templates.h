@@ -6,8 +6,10 @@
 #include <array>
 #include <vector>
 
+#include "programs/webapi_server/Listen.h"
 #include "programs/webapi_server/Message.h"
 #include "programs/webapi_server/Poller.h"
+#include "programs/webapi_server/TakenChannel.h"
 #include "programs/webapi_server/Template.h"
 
 // What the templates tell.
@@ -23,14 +25,22 @@ class TemplateEvents {
     virtual void OnLost(int generation) = 0;
 };
 
+// What a template gets of the master.
+struct Inherited {
+    const Listener& listener;
+    const TakenChannel& taken;
+    SlotTable& slots;
+    const Settings& settings;
+    const OriginalProcess& original;
+};
+
 // The master's side of the templates: the one that workers come from, the one that
 // is being prepared to take its place, and those that finish their orders. A reload
 // goes on while requests are served; a template that cannot be made leaves the one
 // before at work, and is tried again after a while, without its libraries loaded.
 class Templates {
   public:
-    Templates(const Poller& poller, SlotTable& slots, const Settings& settings,
-              const OriginalProcess& original, TemplateEvents& events);
+    Templates(const Poller& poller, const Inherited& inherited, TemplateEvents& events);
     ~Templates();
     Templates(const Templates&) = delete;
     Templates& operator=(const Templates&) = delete;
@@ -77,9 +87,7 @@ class Templates {
     bool HaveLeft();
 
     const Poller& poller_;
-    SlotTable& slots_;
-    const Settings& settings_;
-    const OriginalProcess& original_;
+    const Inherited inherited_;
     TemplateEvents& events_;
     std::array<Handle, 8> all_;
     std::vector<pid_t> leaving_;  // dropped, but not gone yet

@@ -36,12 +36,14 @@ namespace {
 
 // A child of a method's must neither keep the master waiting for this worker's
 // end nor speak for it.
-int controlInChildren = -1;
+WorkerTask taskInChildren = {-1, -1, -1, {}, nullptr};
 
-void LeaveControlInChild() {
-    if (controlInChildren >= 0) {
-        (void)close(controlInChildren);
-        controlInChildren = -1;
+void LeaveSocketsInChild() {
+    for (int* socket : {&taskInChildren.control, &taskInChildren.listener, &taskInChildren.taken}) {
+        if (*socket >= 0) {
+            (void)close(*socket);
+            *socket = -1;
+        }
     }
 }
 
@@ -81,14 +83,18 @@ void SendAll(int connection, const ErrorReply& reply) {
     (void)send(connection, reply.text, reply.size, MSG_NOSIGNAL | MSG_DONTWAIT);
 }
 
+long long LengthOfBody() {
+    const char* const text = getenv("CONTENT_LENGTH");
+    return strtoll(text != nullptr ? text : "0", nullptr, 10);
+}
+
 // A method may read its input to the end, which a connection that the web server
 // keeps open does not have. Where all of the body is here already, its end is made;
 // a small one that is just coming is waited for.
 void EndInputBehindBody() {
     constexpr long long kSmall = 64LL * 1024;
     constexpr int kMostMilliseconds = 1000;
-    const char* const text = getenv("CONTENT_LENGTH");
-    const long long length = strtoll(text != nullptr ? text : "0", nullptr, 10);
+    const long long length = LengthOfBody();
     int here = 0;
     for (int waited = 0; ioctl(STDIN_FILENO, FIONREAD, &here) == 0; ++waited) {
         if (here >= length) {
@@ -122,8 +128,11 @@ class Nowhere {
     Nowhere(const Nowhere&) = delete;
     Nowhere& operator=(const Nowhere&) = delete;
     void Take() const {
-        (void)dup2(nowhere_, STDIN_FILENO);
+        TakeInput();
         (void)dup2(nowhere_, STDOUT_FILENO);
+    }
+    void TakeInput() const {
+        (void)dup2(nowhere_, STDIN_FILENO);
     }
 
   private:
@@ -132,9 +141,9 @@ class Nowhere {
 
 class Worker {
   public:
-    Worker(int control, Slot* slot, const Settings& settings)
-        : control_(control),
-          slot_(slot),
+    Worker(const WorkerTask& task, const Settings& settings)
+        : task_(task),
+          slot_(task.slot),
           settings_(settings),
           process_(getpid()),
           end_(MillisecondsNow() + settings.workerSeconds * 1000LL),
@@ -144,43 +153,66 @@ class Worker {
 
     void Live() {
         int connection = -1;
-        while (SayIdle() && AwaitConnection(&connection) && Serve(connection) && MayGoOn()) {
+        while ((Take(&connection) || (SayIdle() && AwaitConnection(&connection))) &&
+               Serve(connection) && MayGoOn()) {
         }
     }
 
   private:
+    bool Take(int* connection) const;
     bool SayIdle() const;
     bool AwaitConnection(int* connection) const;
 
+    void TakeConnection(int connection);
+    void EndReply() const;
+    void EndConnection() const;
+
     // These answer whether the process may serve another request.
     bool Serve(int connection);
-    bool ServeRead(std::vector<std::string> variables);
+    bool ServeRead();
     bool Run();
     bool PutBack();
     bool MayGoOn();
     bool IsSlim();
 
-    const int control_;
+    const WorkerTask task_;
     Slot* const slot_;
     const Settings& settings_;
     const pid_t process_;
     const long long end_;
     int served_ = 0;
+    bool hasBody_ = false;  // the request
     Environment environment_;
     long long mostMemory_ = 0;
     Nowhere nowhere_;
     ProcessState state_;
 };
 
+// While requests wait, neither this nor the master has to be woken for the next one.
+// The master learns of it before anything is done: it answers for a worker that dies.
+bool Worker::Take(int* connection) const {
+    if (slot_->mayTake == 0) {
+        return false;
+    }
+    *connection = accept4(task_.listener, nullptr, nullptr, SOCK_CLOEXEC);
+    if (*connection < 0) {
+        return false;
+    }
+    slot_->answerBegun = 0;
+    slot_->takenAt = MillisecondsNow();
+    (void)SendMessage(task_.taken, &task_.identity, sizeof task_.identity, *connection, 0);
+    return true;
+}
+
 bool Worker::SayIdle() const {
     const char message = kIdle;
-    return SendMessage(control_, &message, sizeof message, -1, 0);
+    return SendMessage(task_.control, &message, sizeof message, -1, 0);
 }
 
 // False when there is nothing more to do here.
 bool Worker::AwaitConnection(int* connection) const {
     char order = kLeave;
-    const ssize_t size = ReceiveMessage(control_, &order, sizeof order, connection, 0);
+    const ssize_t size = ReceiveMessage(task_.control, &order, sizeof order, connection, 0);
     if (size == sizeof order && order == kServe && *connection >= 0) {
         return true;
     }
@@ -201,10 +233,9 @@ bool Worker::Serve(int connection) {
     std::string reason;
     const ScgiResult result = ReadScgiRequest(connection, ScgiLimits(), &variables, &reason);
     if (result == ScgiResult::kRead) {
-        (void)dup2(connection, STDIN_FILENO);
-        (void)dup2(connection, STDOUT_FILENO);
-        (void)close(connection);
-        return ServeRead(std::move(variables));
+        environment_.Enter(std::move(variables));
+        TakeConnection(connection);
+        return ServeRead();
     }
     Log(LOG_WARNING, "a request cannot be read: " + reason);
     if (result != ScgiResult::kGone) {
@@ -217,20 +248,45 @@ bool Worker::Serve(int connection) {
     return true;
 }
 
+// Each end of input or output wakes the web server: where there is no body, nothing is
+// done to the connection before its end.
+void Worker::TakeConnection(int connection) {
+    hasBody_ = LengthOfBody() > 0;
+    (void)dup2(connection, STDOUT_FILENO);
+    if (hasBody_) {
+        (void)dup2(connection, STDIN_FILENO);
+        EndInputBehindBody();
+    } else {
+        nowhere_.TakeInput();
+    }
+    (void)close(connection);
+}
+
+// Where there was no body there is nothing left to wait for.
+void Worker::EndReply() const {
+    if (!hasBody_) {
+        (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
+    }
+}
+
 // Where nothing of the body is left, the reply ends for the web server before anything
 // else: it closes its side then. Some would also close the client's, which would lose
 // the reply if it still sends: in that case the rest is taken first.
-bool Worker::ServeRead(std::vector<std::string> variables) {
-    environment_.Enter(std::move(variables));
-    EndInputBehindBody();
+void Worker::EndConnection() const {
+    if (hasBody_) {
+        if (!IsBodyStillComing()) {
+            (void)shutdown(STDOUT_FILENO, SHUT_WR);
+        }
+        DiscardInput(true);
+        (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
+    }
+}
+
+bool Worker::ServeRead() {
     BeginCrashReply(&slot_->answerBegun);
     const bool livesOn = Run();
     EndCrashReply();
-    if (!IsBodyStillComing()) {
-        (void)shutdown(STDOUT_FILENO, SHUT_WR);
-    }
-    DiscardInput(true);
-    (void)shutdown(STDOUT_FILENO, SHUT_RDWR);
+    EndConnection();
     nowhere_.Take();
     const bool back = livesOn && PutBack();
     slot_->began = 0;
@@ -246,6 +302,7 @@ bool Worker::Run() {
         _exit(0);
     }
     (void)fflush(stdout);
+    EndReply();
     return entry.LeavesNothingBehind();
 }
 
@@ -274,19 +331,19 @@ bool Worker::IsSlim() {
 
 }  // namespace
 
-int RunWorker(int control, Slot* slot, const Settings& settings) {
-    static const bool registered = pthread_atfork(nullptr, nullptr, LeaveControlInChild) == 0;
+int RunWorker(const WorkerTask& task, const Settings& settings) {
+    static const bool registered = pthread_atfork(nullptr, nullptr, LeaveSocketsInChild) == 0;
     (void)registered;
     try {
         ResetSignals();
         TakeNameOfEntry();
-        controlInChildren = control;
-        slot->pid = getpid();
-        TALO::WebEntry::WatchAnswer(&slot->answerBegun);
-        Worker(control, slot, settings).Live();
+        taskInChildren = task;
+        task.slot->pid = getpid();
+        TALO::WebEntry::WatchAnswer(&task.slot->answerBegun);
+        Worker(task, settings).Live();
     } catch (const std::exception& trouble) {
         Log(LOG_ERR, std::string("the worker ends: ") + trouble.what());
     }
-    controlInChildren = -1;
+    taskInChildren = {-1, -1, -1, {}, nullptr};
     return 0;
 }

@@ -4,10 +4,18 @@
 #include "programs/webapi_server/Settings.h"
 #include "programs/webapi_server/Slot.h"
 
+struct WorkerTask {
+    int control;           // to the master
+    int listener;          // nonblocking
+    int taken;             // for reports of what was accepted there
+    TakenReport identity;  // for these
+    Slot* slot;
+};
+
 // The life of a worker, in a process that was just forked off the template: says
-// kIdle, serves what the master hands over, and goes on or ends as the descriptions
-// of the called APIs say. The working directory is that of the descriptions already.
-// The exit status of the process.
-int RunWorker(int control, Slot* slot, const Settings& settings);
+// kIdle, serves what the master hands over and, where it may, who has connected since,
+// and goes on or ends as the descriptions of the called APIs say. The working directory is that of
+// the descriptions already. The exit status of the process.
+int RunWorker(const WorkerTask& task, const Settings& settings);
 
 #endif

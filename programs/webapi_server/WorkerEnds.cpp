@@ -43,6 +43,7 @@ void Workers::OnProcess(const Event& event, long long now) {
 }
 
 void Workers::Tick(long long now) {
+    ReadTaken(now);
     for (int index = 0; index < pool_.Size(); ++index) {
         PooledWorker& worker = pool_.At(index);
         const long long inState = now - worker.since;
@@ -107,6 +108,7 @@ void Workers::EndAllInTime() {
 }
 
 void Workers::End(int index, long long now) {
+    ReadTaken(now);
     PooledWorker& worker = pool_.At(index);
     if (worker.connection >= 0) {
         SettleConnection(index, now);

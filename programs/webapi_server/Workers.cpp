@@ -18,9 +18,10 @@ constexpr int kAtOncePerProcessor = 2;
 
 }  // namespace
 
-Workers::Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
-                 ConnectionQueue& queue, Farewell& farewell)
+Workers::Workers(const Poller& poller, const TakenChannel& taken, SlotTable& slots,
+                 const Settings& settings, ConnectionQueue& queue, Farewell& farewell)
     : poller_(poller),
+      taken_(taken),
       slots_(slots),
       settings_(settings),
       queue_(queue),
@@ -37,21 +38,20 @@ Workers::~Workers() {
 }
 
 bool Workers::HandOver(const Waiting& waiting, long long now) {
-    return pool_.MayBegin(now) && HandOverAtOnce(waiting, now);
+    return MayBegin(now) && HandOverAtOnce(waiting, now);
 }
 
 bool Workers::HandOverAtOnce(const Waiting& waiting, long long now) {
     for (int index = pool_.ChooseIdle(); index >= 0; index = pool_.ChooseIdle()) {
         PooledWorker& worker = pool_.At(index);
         slots_.Clear(index);
+        slots_.At(index)->mayTake = MayTake(worker) ? 1 : 0;
         const char message = kServe;
         if (SendMessage(worker.control, &message, sizeof message, waiting.connection,
                         MSG_DONTWAIT)) {
             worker.connection = waiting.connection;
             worker.returns = waiting.returns;
-            worker.watch.quietSince = now;
-            worker.watch.progressAt = 0;
-            worker.isTimedOut = false;
+            BeginWatch(worker, now);
             pool_.SetState(index, WorkerState::kBusy, now);
             return true;
         }
@@ -61,13 +61,66 @@ bool Workers::HandOverAtOnce(const Waiting& waiting, long long now) {
     return false;
 }
 
+void Workers::BeginWatch(PooledWorker& worker, long long now) const {
+    worker.watch.quietSince = now;
+    worker.watch.progressAt = 0;
+    worker.isTimedOut = false;
+}
+
+bool Workers::MayBegin(long long now) {
+    for (int index = 0; index < pool_.Size(); ++index) {
+        if (pool_.At(index).state == WorkerState::kBusy) {
+            pool_.BeginAnother(index, slots_.At(index)->takenAt);
+        }
+    }
+    return pool_.MayBegin(now);
+}
+
+void Workers::LetTake(bool may) {
+    if (may != mayTake_) {
+        mayTake_ = may;
+        ShowMayTake();
+    }
+}
+
+// Those of a template that was replaced should come to their end.
+bool Workers::MayTake(const PooledWorker& worker) const {
+    return mayTake_ && worker.generation == templates_->Generation();
+}
+
+void Workers::ShowMayTake() {
+    for (int index = 0; index < pool_.Size(); ++index) {
+        if (pool_.At(index).state == WorkerState::kBusy) {
+            slots_.At(index)->mayTake = MayTake(pool_.At(index)) ? 1 : 0;
+        }
+    }
+}
+
+// With the next connection a worker says that it is done with the one before.
+void Workers::ReadTaken(long long now) {
+    TakenReport report = {};
+    int connection = -1;
+    while (taken_.Read(&report, &connection)) {
+        const int index = pool_.Find(report.slot, report.serial);
+        if (index < 0 || pool_.At(index).state != WorkerState::kBusy) {
+            (void)close(connection);
+            continue;
+        }
+        PooledWorker& worker = pool_.At(index);
+        farewell_.Close(worker.connection, now);
+        worker.connection = connection;
+        worker.returns = 0;
+        BeginWatch(worker, now);
+    }
+}
+
 void Workers::Grow(long long now) {
     const int generation = templates_->Generation();
     if (generation == 0 || now < startNotBefore_) {
         return;
     }
     // Who waits only for others to be done needs no worker of its own.
-    const int waiting = pool_.MayBegin(now) ? queue_.Size() : 0;
+    const int waiting = MayBegin(now) ? queue_.Size() : 0;
     for (int count = pool_.ToStart(generation, waiting); count > 0; --count) {
         if (!Start(generation, now)) {
             return;
@@ -122,6 +175,7 @@ void Workers::OnControl(const Event& event, long long now) {
 }
 
 void Workers::BecomeIdle(int index, long long now) {
+    ReadTaken(now);
     PooledWorker& worker = pool_.At(index);
     if (worker.state == WorkerState::kBusy) {
         // Of a request that could not be read, the rest may still be there.
@@ -184,6 +238,7 @@ void Workers::CloseDescriptors(PooledWorker& worker) const {
 
 void Workers::OnReady(int) {
     startNotBefore_ = 0;
+    ShowMayTake();
 }
 
 void Workers::OnStarted(const TemplateReport& report, int process) {

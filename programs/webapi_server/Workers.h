@@ -7,15 +7,17 @@
 #include "programs/webapi_server/Pool.h"
 #include "programs/webapi_server/Queue.h"
 #include "programs/webapi_server/SlotTable.h"
+#include "programs/webapi_server/TakenChannel.h"
 #include "programs/webapi_server/Templates.h"
 
 // The master's side of the workers: starts them, hands requests over, sees to it that
 // each request is answered whatever becomes of its worker. The master has a duplicate
-// of every connection until its worker is done with it.
+// of every connection until its worker is done with it, also of those that workers take
+// by themselves.
 class Workers : public TemplateEvents {
   public:
-    Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
-            ConnectionQueue& queue, Farewell& farewell);
+    Workers(const Poller& poller, const TakenChannel& taken, SlotTable& slots,
+            const Settings& settings, ConnectionQueue& queue, Farewell& farewell);
     ~Workers() override;
     Workers(const Workers&) = delete;
     Workers& operator=(const Workers&) = delete;
@@ -33,6 +35,15 @@ class Workers : public TemplateEvents {
     bool HaveIdle() const {
         return pool_.Count(WorkerState::kIdle) > 0;
     }
+
+    // Whether one more request may begin now.
+    bool MayBegin(long long now);
+
+    // Whether workers that are done may take who connects by themselves.
+    void LetTake(bool may);
+
+    // Sees which connections they have taken.
+    void ReadTaken(long long now);
 
     // Starts what is wanted while so many requests wait.
     void Grow(long long now);
@@ -67,6 +78,9 @@ class Workers : public TemplateEvents {
 
   private:
     bool Start(int generation, long long now);
+    bool MayTake(const PooledWorker& worker) const;
+    void ShowMayTake();
+    void BeginWatch(PooledWorker& worker, long long now) const;
     void BecomeIdle(int index, long long now);
     void Dismiss(int index, long long now);
     void DismissOlder(long long now);
@@ -81,12 +95,14 @@ class Workers : public TemplateEvents {
     std::string ApiOf(int index) const;
 
     const Poller& poller_;
+    const TakenChannel& taken_;
     SlotTable& slots_;
     const Settings& settings_;
     ConnectionQueue& queue_;
     Farewell& farewell_;
     Templates* templates_ = nullptr;
     Pool pool_;
+    bool mayTake_ = false;
     long long startNotBefore_ = 0;
     int startFailures_ = 0;  // in a row
 };

@@ -5,10 +5,12 @@
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cstring>
 
+#include "programs/webapi_server/Message.h"
 #include "tests/support/TempFolder.h"
 
 namespace {
@@ -78,6 +80,32 @@ TEST_F(ListenTest, ReplacesOneThatWasLeftBehind) {
     Listener listener;
     EXPECT_TRUE(listener.Make(path, 5, &problem)) << problem;
     EXPECT_TRUE(CanConnect());
+}
+
+// Workers that have a request keep the socket open when their server is killed.
+TEST_F(ListenTest, ReplacesOneThatIsOpenStillButWhoListenedIsGone) {
+    int ends[2] = {};
+    ASSERT_EQ(socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, ends), 0);
+    const pid_t server = fork();
+    if (server == 0) {
+        Listener listener;
+        const bool listens = listener.Make(path, 5, &problem);
+        (void)SendMessage(ends[1], "", 1, listener.Get(), 0);
+        _exit(listens ? 0 : 1);
+    }
+    int kept = -1;
+    char message = 0;
+    ASSERT_EQ(ReceiveMessage(ends[0], &message, 1, &kept, 0), 1);
+    ASSERT_GE(kept, 0);
+    int status = 0;
+    ASSERT_EQ(waitpid(server, &status, 0), server);
+    ASSERT_TRUE(CanConnect());
+    Listener listener;
+    EXPECT_TRUE(listener.Make(path, 5, &problem)) << problem;
+    EXPECT_TRUE(CanConnect());
+    for (const int descriptor : {kept, ends[0], ends[1]}) {
+        close(descriptor);
+    }
 }
 
 TEST_F(ListenTest, RefusesOneThatIsInUse) {

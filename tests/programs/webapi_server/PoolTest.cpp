@@ -52,6 +52,18 @@ TEST_F(PoolTest, LetsNoMoreBeginThanMayBeNewAtTheSameTime) {
     EXPECT_TRUE(pool.MayBegin(102));
 }
 
+TEST_F(PoolTest, TakesAWorkerForNewThatHasGoneOnWithAnotherRequest) {
+    Have(3, WorkerState::kBusy, 100);
+    EXPECT_TRUE(pool.MayBegin(110));
+    for (int index = 0; index < 3; ++index) {
+        pool.BeginAnother(index, 108);
+    }
+    EXPECT_FALSE(pool.MayBegin(110));
+    pool.BeginAnother(0, 0);
+    EXPECT_FALSE(pool.MayBegin(110));
+    EXPECT_TRUE(pool.MayBegin(113));
+}
+
 TEST_F(PoolTest, FollowsWhatWaitsUpToTheMaximum) {
     Have(1, WorkerState::kBusy);
     EXPECT_EQ(pool.ToStart(kGeneration, 3), 3);

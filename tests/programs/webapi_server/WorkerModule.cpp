@@ -89,6 +89,16 @@ void Crash(APIRequest*, APIResponse*) {
     abort();
 }
 
+// Answers what is left of the input, up to its end.
+void Input(APIRequest*, APIResponse* response) {
+    std::string text;
+    char block[256];
+    for (ssize_t got = 0; (got = read(STDIN_FILENO, block, sizeof block)) > 0;) {
+        text.append(block, static_cast<size_t>(got));
+    }
+    response->SetSuccess(text);
+}
+
 void Raw(APIRequest*, APIResponse* response) {
     response->SetEnableOutput(false);
     std::cout << "Content-Type: text/plain\r\n\r\nraw";
@@ -98,7 +108,8 @@ TALO::_tag_API_TABLE table[] = {
     {"Test.Lives", 1, "echo", Echo},   {"Test.Lives", 1, "variable", Variable},
     {"Test.Lives", 1, "leave", Leave}, {"Test.Lives", 1, "child", Child},
     {"Test.Lives", 1, "crash", Crash}, {"Test.Lives", 1, "raw", Raw},
-    {"Test.Ends", 1, "echo", Echo},    {nullptr, 0, nullptr, nullptr},
+    {"Test.Lives", 1, "input", Input}, {"Test.Ends", 1, "echo", Echo},
+    {nullptr, 0, nullptr, nullptr},
 };
 
 }  // namespace

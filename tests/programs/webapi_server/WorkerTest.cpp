@@ -5,6 +5,7 @@
 #include <sys/mman.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
+#include <sys/un.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -23,7 +24,7 @@ constexpr int kPatience = 20000;  // milliseconds
 
 const char kLives[] = R"({"Test.Lives": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
     "authLevel": 0, "isolation": "worker", "deadline": 7, "methods": {"1": ["echo", "variable",
-    "leave", "child", "crash", {"raw": {"allowDownload": true}}]}}})";
+    "leave", "child", "crash", "input", {"raw": {"allowDownload": true}}]}}})";
 const char kEnds[] = R"({"Test.Ends": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
     "authLevel": 0, "methods": {"1": ["echo"]}}})";
 const char kCompound[] = R"({"TALO.Entry.Request": {"lib": "", "minVersion": 1, "maxVersion": 1,
@@ -60,8 +61,10 @@ class WorkerLife : public testing::Test {
         slot_ = new (memory) Slot();
     }
     ~WorkerLife() override {
-        if (control_ >= 0) {
-            (void)close(control_);
+        for (const int descriptor : {control_, listener_, taken_[0], taken_[1]}) {
+            if (descriptor >= 0) {
+                (void)close(descriptor);
+            }
         }
         if (worker_ > 0) {
             (void)kill(worker_, SIGKILL);
@@ -79,11 +82,50 @@ class WorkerLife : public testing::Test {
             (void)setrlimit(RLIMIT_CORE, &none);
             (void)close(ends[0]);
             (void)!chdir(folder_.Path("").c_str());
-            _exit(RunWorker(ends[1], slot_, settings_));
+            _exit(RunWorker({ends[1], listener_, taken_[1], {7, 70}, slot_}, settings_));
         }
         (void)close(ends[1]);
         control_ = ends[0];
         ASSERT_TRUE(SaysIdle());
+    }
+
+    // Before Start: where clients connect while the worker has a request.
+    void Listen() {
+        listener_ = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+        const struct sockaddr_un address = Address();
+        ASSERT_EQ(
+            0, bind(listener_, reinterpret_cast<const struct sockaddr*>(&address), sizeof address));
+        ASSERT_EQ(0, listen(listener_, 8));
+        ASSERT_EQ(0, socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, taken_));
+    }
+
+    // A client there, which has sent a call already.
+    int ConnectToListener(const std::string& method) const {
+        const int client = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        const struct sockaddr_un address = Address();
+        EXPECT_EQ(
+            0, connect(client, reinterpret_cast<const struct sockaddr*>(&address), sizeof address));
+        const std::string bytes =
+            support::HeaderBlock({{"CONTENT_LENGTH", "0"},
+                                  {"SCGI", "1"},
+                                  {"QUERY_STRING", "api=Test.Lives&version=1&method=" + method}});
+        EXPECT_EQ(static_cast<ssize_t>(bytes.size()), write(client, bytes.data(), bytes.size()));
+        return client;
+    }
+    bool HasClients() const {
+        struct pollfd input = {listener_, POLLIN, 0};
+        return poll(&input, 1, 0) == 1;
+    }
+
+    // The master's duplicate of a connection that the worker has taken; -1 when it has
+    // told of none.
+    int Taken() const {
+        TakenReport report = {};
+        int connection = -1;
+        const ssize_t got =
+            ReceiveMessage(taken_[0], &report, sizeof report, &connection, MSG_DONTWAIT);
+        EXPECT_TRUE(got != sizeof report || (report.slot == 7 && report.serial == 70));
+        return connection;
     }
 
     // False when the worker has closed its side instead.
@@ -141,11 +183,21 @@ class WorkerLife : public testing::Test {
         return WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status);
     }
 
+    struct sockaddr_un Address() const {
+        struct sockaddr_un address = {};
+        address.sun_family = AF_UNIX;
+        const std::string path = folder_.Path("socket");
+        (void)path.copy(address.sun_path, sizeof address.sun_path - 1);
+        return address;
+    }
+
     support::TempFolder folder_;
     Settings settings_;
     Slot* slot_;
     pid_t worker_ = -1;
     int control_ = -1;
+    int listener_ = -1;
+    int taken_[2] = {-1, -1};
 };
 
 Json::Value Body(const std::string& reply) {
@@ -171,6 +223,85 @@ TEST_F(WorkerLife, ServesOneRequestAfterTheOther) {
         ASSERT_TRUE(SaysIdle());
     }
     EXPECT_EQ(worker_, slot_->pid);
+}
+
+TEST_F(WorkerLife, TakesWhoHasConnectedSinceAndTellsTheMaster) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int first = ConnectToListener("echo&text=first");
+    const int second = ConnectToListener("echo&text=second");
+    EXPECT_EQ("led", Body(Call("echo", "text=led"))["data"]["text"].asString());
+    EXPECT_EQ("first", Body(ReadAll(first))["data"]["text"].asString());
+    EXPECT_EQ("second", Body(ReadAll(second))["data"]["text"].asString());
+    EXPECT_FALSE(HasClients());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_GT(slot_->takenAt, 0);
+    for (const int client : {first, second}) {
+        const int connection = Taken();
+        EXPECT_GE(connection, 0);
+        (void)close(connection);
+        (void)close(client);
+    }
+    EXPECT_EQ(-1, Taken());
+}
+
+// Whoever ends it meanwhile must not take it for answered.
+TEST_F(WorkerLife, TellsOfWhoItTookBeforeItServes) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int client = ConnectToListener("crash");
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    EXPECT_LT(1000, Ended());
+    const int connection = Taken();
+    EXPECT_GE(connection, 0);
+    (void)close(connection);
+    EXPECT_EQ(117, Body(ReadAll(client))["error"]["code"].asInt());
+    (void)close(client);
+}
+
+TEST_F(WorkerLife, LeavesClientsToTheMasterUnlessItMayTakeThem) {
+    Listen();
+    Start();
+    const int client = ConnectToListener("echo");
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(HasClients());
+    EXPECT_EQ(-1, Taken());
+    (void)close(client);
+}
+
+TEST_F(WorkerLife, TakesNobodyWhenItsRequestWasItsLast) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int client = ConnectToListener("echo");
+    EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo"))["success"].asBool());
+    EXPECT_EQ(0, Ended());
+    EXPECT_TRUE(HasClients());
+    (void)close(client);
+}
+
+// The socket is closed for clients when nobody accepts any more.
+TEST_F(WorkerLife, LeavesTheListenerToNoChildOfAMethod) {
+    Listen();
+    Start();
+    const int child = Body(Call("child"))["data"].asInt();
+    ASSERT_GT(child, 0);
+    ASSERT_TRUE(SaysIdle());
+    const std::string number = std::to_string(listener_);
+    char target[64] = {};
+    EXPECT_EQ(-1, readlink(("/proc/" + std::to_string(child) + "/fd/" + number).c_str(), target,
+                           sizeof target));
+    EXPECT_EQ(0, kill(child, SIGKILL));
+}
+
+// Where there is no body the end of input is there at once, as of any CGI program.
+TEST_F(WorkerLife, GivesNoInputToARequestWithoutABody) {
+    Start();
+    EXPECT_EQ("", Body(Call("input"))["data"].asString());
+    ASSERT_TRUE(SaysIdle());
 }
 
 TEST_F(WorkerLife, ServesABodyAndLeavesNoneOfItToTheNextRequest) {

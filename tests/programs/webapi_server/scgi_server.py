@@ -172,7 +172,7 @@ class ServerTest(unittest.TestCase):
         found = []
         for process in self.processes():
             with contextlib.suppress(OSError):
-                if os.readlink(f"/proc/{process}/fd/0").startswith("socket:"):
+                if os.readlink(f"/proc/{process}/fd/1").startswith("socket:"):
                     found.append(process)
         return found
 

@@ -13,7 +13,7 @@ from scgi_server import LONG, wait_for
 
 CLIENT = os.environ["SOAK_CLIENT"]
 REQUESTS = int(os.environ.get("SOAK_REQUESTS", "100000"))
-CLIENTS = 4
+CLIENTS = 16
 WORKERS = 4
 FAR_TOO_LONG = 3600
 # What the allocator may keep of what was there at the same time, once.

@@ -16,6 +16,8 @@ import unittest
 import scgi_server
 from scgi_server import LIVING, LONG, ONCE, PATIENT, SERVER, Reply, query_request, wait_for
 
+SOAK_CLIENT = os.environ["SOAK_CLIENT"]
+
 
 class Answers(scgi_server.ServerTest):
     def test_answers_a_request(self):
@@ -151,6 +153,32 @@ class Workers(scgi_server.ServerTest):
         self.echo()
         self.assertLessEqual(len(self.processes()), 8)
 
+    def test_wakes_the_master_for_few_requests_under_load(self):
+        server = self.start()
+        self.echo()
+        requests = 20000
+        clients = 8 * os.cpu_count()
+
+        def wakes():
+            with open(f"/proc/{server.pid}/status", encoding="ascii") as file:
+                return sum(int(line.split()[1]) for line in file if "ctxt_switches" in line)
+
+        before = wakes()
+        command = [SOAK_CLIENT, self.socket, str(requests), str(min(clients, 64)), "0"]
+        subprocess.run(command, check=True, timeout=LONG)
+        # Two for each, if it handed over every one.
+        self.assertLess(wakes() - before, requests)
+
+    def test_lets_go_of_clients_that_workers_took(self):
+        server = self.start("--max-workers", "4")
+        self.echo()
+        sockets = f"/proc/{server.pid}/fd"
+        command = [SOAK_CLIENT, self.socket, "5000", "16", "0"]
+        subprocess.run(command, check=True, timeout=LONG)
+        # Signals, events, listener, reports, template, and two for each worker.
+        self.assertTrue(wait_for(lambda: len(os.listdir(sockets)) <= 3 + 7 + 2 * 4),
+                        os.listdir(sockets))
+
     def test_replaces_a_worker_that_died_while_idle(self):
         server = self.start("--min-workers", "6")
         self.echo()
@@ -171,6 +199,12 @@ class Workers(scgi_server.ServerTest):
             self.echo(ONCE)
         self.assertNotIn(template, self.children(server.pid))
 
+    def accepts(self):
+        with contextlib.suppress(ConnectionRefusedError):
+            self.connect().close()
+            return True
+        return False
+
     def test_gives_a_worker_no_descriptor_but_its_own(self):
         server = self.start("--max-workers", "4")
         busy = [self.connect() for _ in range(3)]
@@ -186,8 +220,13 @@ class Workers(scgi_server.ServerTest):
                     continue
                 if target.startswith("socket:"):
                     seen.setdefault(target, set()).add(worker)
-        self.assertTrue(seen)
-        shared = {target: users for target, users in seen.items() if len(users) > 1}
+        # The template has none of a request; what it has is of all of them.
+        (template,) = self.children(server.pid)
+        common = {target for target, users in seen.items() if template in users}
+        self.assertEqual(len(common), 3, common)
+        shared = {target: users for target, users in seen.items()
+                  if len(users) > 1 and target not in common}
+        self.assertEqual(sum(target not in common for target in seen), 3 + 3 + 1)
         for connection in busy:
             with connection:
                 self.read_all(connection)
@@ -229,6 +268,22 @@ class Workers(scgi_server.ServerTest):
             server.wait()
             self.assertEqual(Reply(self.read_all(connection)).body["data"]["nonce"], "late")
         self.assertTrue(wait_for(lambda: not self.processes()), self.processes())
+
+    def test_is_replaced_when_it_is_killed(self):
+        """Also while a worker of it has a request, and others wait."""
+        server = self.start("--min-workers", "1", "--max-workers", "1")
+        self.echo()
+        with self.connect() as busy, self.connect() as waiting:
+            busy.sendall(query_request(PATIENT, "dawdle", milliseconds=1500, nonce="late"))
+            self.assertTrue(wait_for(self.busy))
+            server.kill()
+            server.wait()
+            waiting.settimeout(LONG)
+            self.assertEqual(waiting.recv(1), b"")
+            self.start()
+            self.assertTrue(wait_for(self.accepts))
+            self.echo()
+            self.assertEqual(Reply(self.read_all(busy)).body["data"]["nonce"], "late")
 
 
 class Signals(scgi_server.ServerTest):
