@@ -34,11 +34,11 @@ bool ShowsStartName() {
 }
 
 // The base name of the program as the system shows it. Reading ends at a blank:
-// arguments that were joined into one are left out.
-std::string ReadStartName() {
+// arguments that were joined into one are left out. False when it cannot be read.
+bool ReadStartName(std::string* name) {
     const int commandLine = open("/proc/self/cmdline", O_RDONLY | O_CLOEXEC);
     if (commandLine < 0) {
-        return program_invocation_short_name;
+        return false;
     }
     constexpr char kEnds[] = {' ', '\0'};
     std::string text;
@@ -50,7 +50,8 @@ std::string ReadStartName() {
         end = text.find_first_of(kEnds, 0, sizeof kEnds);
     }
     (void)close(commandLine);
-    return basename(text.substr(0, end).c_str());
+    *name = basename(text.substr(0, end).c_str());
+    return true;
 }
 
 // What was read when the first argument held this text. It is what the system shows.
@@ -68,10 +69,14 @@ std::string StartName() {
     static Read last = {};
     const char* const argument = program_invocation_name;
     if (argument != last.argument || strcmp(argument, last.text) != 0) {
-        last.startName = ReadStartName();
-        const bool fits = strlen(argument) < sizeof last.text;
-        last.argument = fits ? argument : nullptr;
-        (void)snprintf(last.text, sizeof last.text, "%s", argument);
+        last.argument = nullptr;
+        if (!ReadStartName(&last.startName)) {
+            return program_invocation_short_name;
+        }
+        if (strlen(argument) < sizeof last.text) {
+            (void)snprintf(last.text, sizeof last.text, "%s", argument);
+            last.argument = argument;
+        }
     }
     return last.startName;
 }

@@ -49,6 +49,7 @@ TEST(StartName, IsTheCLibrarysWhenTheArgumentsCannotBeRead) {
         program_invocation_short_name = known;
         EXPECT_NE(APIRunnerPrivate(nullptr).origProcName, "known-to-libc");
         probe::RefuseSystemCall(SYS_openat, EACCES);
+        probe::Arguments()[0][0] ^= 1;
         const APIRunnerPrivate d(nullptr);
         EXPECT_EQ(d.origProcName, "known-to-libc");
         EXPECT_EQ(d.procName, "known-to-libc");
@@ -71,6 +72,19 @@ TEST(StartName, IsRememberedWhileTheArgumentShowsIt) {
         EXPECT_EQ(APIRunnerPrivate(nullptr).origProcName, start);
         own[0] = own[0] == 'x' ? 'y' : 'x';
         EXPECT_EQ(APIRunnerPrivate(nullptr).origProcName, "known-to-libc");
+    });
+}
+
+// Whoever serves on puts the first argument back behind a request.
+TEST(StartName, IsRememberedForTheTextThatItWasReadFrom) {
+    runner::InChild([] {
+        char* const own = probe::Arguments()[0];
+        const std::string text = own;
+        const std::string start = APIRunnerPrivate(nullptr).origProcName;
+        own[0] = own[0] == 'x' ? 'y' : 'x';
+        (void)text.copy(own, text.size());
+        probe::RefuseSystemCall(SYS_openat, EACCES);
+        EXPECT_EQ(APIRunnerPrivate(nullptr).origProcName, start);
     });
 }
 
