@@ -28,8 +28,9 @@ bool CheckSession(const std::string& folder, const std::string& id, const std::s
     if (stat(path.c_str(), &facts) != 0 || !ReadJson(path, &session) || !session.isObject()) {
         return false;
     }
-    if (session["address"] != address || time(nullptr) - facts.st_mtime > kTimeoutSeconds) {
+    const time_t now = time(nullptr);
+    if (session["address"] != address || now - facts.st_mtime > kTimeoutSeconds) {
         return false;
     }
-    return utimensat(AT_FDCWD, path.c_str(), nullptr, 0) == 0;
+    return facts.st_mtime == now || utimensat(AT_FDCWD, path.c_str(), nullptr, 0) == 0;
 }

@@ -17,7 +17,9 @@ function check_session(string $folder, string $id, string $address): bool
     if (!is_array($session) || ($session['address'] ?? '') !== $address) {
         return false;
     }
-    return time() - filemtime($path) <= TIMEOUT_SECONDS && touch($path);
+    $now = time();
+    $last = filemtime($path);
+    return $now - $last <= TIMEOUT_SECONDS && ($last === $now || touch($path));
 }
 
 function lists(array $description, string $name, string $version, string $method): bool

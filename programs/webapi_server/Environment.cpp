@@ -63,6 +63,7 @@ Environment::Environment() : before_(environ) {
             base_.emplace_back(variable);
         }
     }
+    baseEntries_ = Merge();
 }
 
 Environment::~Environment() {
@@ -72,18 +73,18 @@ Environment::~Environment() {
 void Environment::Enter(std::vector<std::string> variables) {
     variables.insert(variables.begin(), kInterface);
     request_.swap(variables);
-    Show();
+    Merge().swap(entries_);
+    environ = entries_.data();
 }
 
+// The texts of the request go when nobody points to them.
 void Environment::Leave() {
-    std::vector<std::string> none;
-    request_.swap(none);
-    Show();
+    environ = baseEntries_.data();
+    entries_.clear();
+    request_.clear();
 }
 
-// An element of the result may be of the texts of before: `environ` follows at
-// once, and the old texts go when nobody points to them.
-void Environment::Show() {
+std::vector<char*> Environment::Merge() {
     std::vector<Named> named;
     named.reserve(base_.size() + request_.size());
     for (std::vector<std::string>* variables : {&base_, &request_}) {
@@ -102,6 +103,5 @@ void Environment::Show() {
         }
     }
     entries.push_back(nullptr);
-    entries_.swap(entries);
-    environ = entries_.data();
+    return entries;
 }

@@ -27,10 +27,12 @@ class Environment {
     void Leave();
 
   private:
-    void Show();
+    // What `environ` is to point to; ends with a null.
+    std::vector<char*> Merge();
 
     char** const before_;
     std::vector<std::string> base_;
+    std::vector<char*> baseEntries_;
     std::vector<std::string> request_;
     std::vector<char*> entries_;
 };

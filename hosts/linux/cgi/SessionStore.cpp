@@ -227,11 +227,18 @@ bool FindSession(const std::string& id, Session* session) {
 }
 
 // Read first: touching follows links and takes folders. Only the time is another
-// afterwards.
+// afterwards. It counts in seconds: with each touch all other processes would read
+// the file again.
 bool RenewSession(const std::string& id) {
     Session session;
+    if (!host::ReadSession(id, &session)) {
+        return false;
+    }
+    if (session.lastUse == time(nullptr)) {
+        return true;
+    }
     const std::string path = host::PathOf(id);
-    if (!host::ReadSession(id, &session) || TLIBCFileUTime(path.c_str(), 1, 0) < 0) {
+    if (TLIBCFileUTime(path.c_str(), 1, 0) < 0) {
         return false;
     }
     const host::FileState now(path);

@@ -1,8 +1,10 @@
 #include <sys/stat.h>
 #include <time.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <string>
+#include <utility>
 
 #include "tests/host/cgi/SessionFixture.h"
 
@@ -75,6 +77,37 @@ TEST_F(SessionStore, RenewsTheLastUseAndNothingElse) {
     EXPECT_TRUE(talo::RenewSession(id));
     EXPECT_GE(Found(id).lastUse, before - 1);
     EXPECT_EQ(Read(id), record);
+}
+
+// Others that have read it need not read it again.
+TEST_F(SessionStore, LeavesATimeOfThisSecondAlone) {
+    const std::string id = Open();
+    const auto changed = [&] {
+        struct stat facts = {};
+        EXPECT_EQ(stat(PathOf(id).c_str(), &facts), 0);
+        return std::make_pair(facts.st_ctim.tv_sec, facts.st_ctim.tv_nsec);
+    };
+    // A try that ends in another second than it began in tells nothing.
+    for (int tries = 0; tries < 5; ++tries) {
+        const time_t second = time(nullptr);
+        EXPECT_TRUE(talo::RenewSession(id));
+        const auto first = changed();
+        (void)usleep(20000);
+        EXPECT_TRUE(talo::RenewSession(id));
+        if (time(nullptr) == second) {
+            EXPECT_EQ(changed(), first);
+            EXPECT_EQ(Found(id).lastUse, second);
+            return;
+        }
+    }
+    FAIL() << "no two calls in one second";
+}
+
+TEST_F(SessionStore, RenewsATimeInTheFuture) {
+    const std::string id = Open();
+    LeaveUnused(id, -1000);
+    EXPECT_TRUE(talo::RenewSession(id));
+    EXPECT_LE(Found(id).lastUse, time(nullptr));
 }
 
 TEST_F(SessionStore, RenewsNothingThatIsNotThere) {
