@@ -12,9 +12,10 @@ namespace {
 constexpr char kBind[] = "LD_BIND_NOW";
 constexpr char kByUs[] = "webapi-server";
 
-// A request makes and frees some thousand small pieces.
+// A request makes and frees some thousand small pieces. What is kept of them apart,
+// unmerged, is merged piece by piece whenever something large comes.
 constexpr char kTunables[] = "GLIBC_TUNABLES";
-constexpr char kKeepFreed[] = "glibc.malloc.tcache_count=1000";
+constexpr char kKeepFreed[] = "glibc.malloc.tcache_count=1000:glibc.malloc.mxfast=0";
 
 bool Is(const char* name, const char* value) {
     const char* const found = getenv(name);

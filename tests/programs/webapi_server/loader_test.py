@@ -7,7 +7,7 @@ import unittest
 
 PROBE = os.environ["LOADER_PROBE"]
 BOUND = "LD_BIND_NOW=webapi-server"
-KEEPING = "GLIBC_TUNABLES=glibc.malloc.tcache_count=1000"
+KEEPING = "GLIBC_TUNABLES=glibc.malloc.tcache_count=1000:glibc.malloc.mxfast=0"
 
 
 class Beginning(unittest.TestCase):
