@@ -91,10 +91,10 @@ std::vector<pid_t> Children() {
     return std::vector<pid_t>(std::istream_iterator<pid_t>(list), std::istream_iterator<pid_t>());
 }
 
-// Background tasks and callbacks have a session of their own. A callback's process may
-// be so young that it has none yet.
+// As background tasks are, and callbacks of before. One that a method has just begun
+// may be about to be.
 bool IsDetached(pid_t child) {
-    constexpr int kMostMilliseconds = 3000;
+    constexpr int kMostMilliseconds = 100;
     for (int waited = 0; waited < kMostMilliseconds; ++waited) {
         const pid_t session = getsid(child);
         if (session == child || session < 0) {
@@ -105,7 +105,7 @@ bool IsDetached(pid_t child) {
     return false;
 }
 
-void EndChildren(std::vector<std::string>* changes) {
+void EndChildren(pid_t spared, std::vector<std::string>* changes) {
     pid_t ended = 0;
     while ((ended = waitpid(-1, nullptr, WNOHANG)) > 0) {
     }
@@ -113,7 +113,7 @@ void EndChildren(std::vector<std::string>* changes) {
         return;
     }
     for (const pid_t child : Children()) {
-        if (!IsDetached(child)) {
+        if (child != spared && !IsDetached(child)) {
             (void)kill(child, SIGKILL);
             (void)waitpid(child, nullptr, 0);
             changes->emplace_back("a child still runs");
@@ -185,7 +185,7 @@ void ProcessState::ReturnMemory() {
 }
 
 // What the system tells as before is as before; the rest is looked at one by one.
-std::vector<std::string> ProcessState::Restore() {
+std::vector<std::string> ProcessState::Restore(pid_t spared) {
     std::vector<std::string> changes;
     (void)status_.Read();
     const Told now = Tell();
@@ -211,7 +211,7 @@ std::vector<std::string> ProcessState::Restore() {
         RestoreIds(&changes);
     }
     RestoreName();
-    EndChildren(&changes);
+    EndChildren(spared, &changes);
     // One that has just been waited for may have been counted still.
     if (status_.Number("Threads") > threads_ && status_.Read() &&
         status_.Number("Threads") > threads_) {

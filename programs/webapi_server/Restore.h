@@ -29,8 +29,9 @@ class ProcessState {
     // Puts everything back and tells in words what a method that leaves nothing
     // behind would not have changed; nothing when the process may serve on. What
     // any request leaves goes unmentioned: names of the process, children that have
-    // ended, the rest of a body.
-    std::vector<std::string> Restore();
+    // ended or are of a session of their own, the rest of a body. So does the child
+    // `spared`, which may be about to begin one; 0 for none.
+    std::vector<std::string> Restore(pid_t spared = 0);
 
     // Memory that is no file's, as it was at the end of the last Restore, what was
     // there before a fork included. -1 when the system does not tell.

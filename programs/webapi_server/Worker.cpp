@@ -182,6 +182,7 @@ class Worker {
     const long long end_;
     int served_ = 0;
     bool hasBody_ = false;  // the request
+    pid_t callback_ = 0;    // its child for what was to happen behind the reply
     Environment environment_;
     long long mostMemory_ = 0;
     Nowhere nowhere_;
@@ -296,7 +297,7 @@ bool Worker::ServeRead() {
 bool Worker::Run() {
     WarmEntry entry(slot_, settings_.deadlineSeconds);
     entry.SetArgs(1, &program_invocation_name);
-    (void)entry.Run(Json::Value());
+    callback_ = entry.Run(Json::Value());
     // A child of a method's that found its way here has no request to end.
     if (getpid() != process_) {
         _exit(0);
@@ -309,7 +310,7 @@ bool Worker::Run() {
 bool Worker::PutBack() {
     talo::ForgetRequest();
     environment_.Leave();
-    const std::vector<std::string> changes = state_.Restore();
+    const std::vector<std::string> changes = state_.Restore(callback_);
     for (const std::string& change : changes) {
         Log(LOG_ERR, std::string(slot_->api) + " left something behind: " + change);
     }
