@@ -18,6 +18,7 @@ namespace {
 constexpr int kMostEvents = 64;
 constexpr int kMostAccepted = 64;  // in one go
 constexpr int kMostCounted = 1024;
+constexpr long long kCountPause = 500;
 constexpr long long kTick = 100;
 constexpr long long kIdleTick = 1000;
 constexpr long long kAcceptPause = 100;
@@ -159,8 +160,9 @@ void Master::Accept() {
     }
 }
 
-// Those in the socket can only be counted by taking them.
+// Those in the socket can only be counted by taking them, which wakes somebody for each.
 void Master::CountClients() {
+    nextCount_ = now_ + kCountPause;
     for (int count = 0; isAccepting_ && count < kMostCounted && AcceptOne(); ++count) {
     }
 }
@@ -269,7 +271,7 @@ void Master::Tick() {
     if (!isAccepting_ && drainUntil_ == 0 && now_ >= acceptNotBefore_) {
         isAccepting_ = true;
     }
-    if (!isWatching_) {
+    if (!isWatching_ && now_ >= nextCount_) {
         CountClients();
     }
 }

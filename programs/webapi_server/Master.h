@@ -57,6 +57,7 @@ class Master {
     bool isWatching_ = false;  // for clients; otherwise workers take them
     bool hasClients_ = false;  // to accept
     long long acceptNotBefore_ = 0;
+    long long nextCount_ = 0;   // of those who wait in the socket
     long long drainUntil_ = 0;  // 0: goes on
     long long nextRefusalLog_ = 0;
     int refusals_ = 0;
