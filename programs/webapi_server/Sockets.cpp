@@ -7,20 +7,21 @@
 namespace {
 
 int OutOfTheWay(int descriptor) {
-    return descriptor >= 0 ? fcntl(descriptor, F_DUPFD_CLOEXEC, kTakenSocket + 1) : -1;
+    return fcntl(descriptor, F_DUPFD_CLOEXEC, kTakenSocket + 1);
 }
 
 void Put(int descriptor, int number) {
-    if (descriptor >= 0) {
-        (void)dup3(descriptor, number, O_CLOEXEC);
-    }
+    (void)dup3(descriptor, number, O_CLOEXEC);
 }
 
 }  // namespace
 
+// Standard input is nowhere: it takes the place of a listener that is closed, so that
+// nothing else gets its number.
 void KeepOnly(const Sockets& sockets) {
     closelog();
-    const Sockets aside = {OutOfTheWay(sockets.control), OutOfTheWay(sockets.listener),
+    const int listener = sockets.listener >= 0 ? sockets.listener : STDIN_FILENO;
+    const Sockets aside = {OutOfTheWay(sockets.control), OutOfTheWay(listener),
                            OutOfTheWay(sockets.taken)};
     (void)close_range(kControlSocket, kTakenSocket, 0);
     Put(aside.control, kControlSocket);

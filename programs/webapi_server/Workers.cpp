@@ -26,7 +26,8 @@ Workers::Workers(const Poller& poller, const TakenChannel& taken, SlotTable& slo
       settings_(settings),
       queue_(queue),
       farewell_(farewell),
-      pool_(settings.minWorkers, settings.maxWorkers, kAtOncePerProcessor * get_nprocs()) {}
+      pool_(settings.minWorkers, settings.maxWorkers,
+            std::min(kAtOncePerProcessor * get_nprocs(), settings.maxWorkers)) {}
 
 Workers::~Workers() {
     for (int index = 0; index < pool_.Size(); ++index) {
