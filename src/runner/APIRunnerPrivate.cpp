@@ -68,7 +68,8 @@ std::string StartName() {
     }
     static Read last = {};
     const char* const argument = program_invocation_name;
-    if (argument != last.argument || strcmp(argument, last.text) != 0) {
+    if (last.argument == nullptr || argument != last.argument ||
+        strcmp(last.argument, last.text) != 0) {
         last.argument = nullptr;
         if (!ReadStartName(&last.startName)) {
             return program_invocation_short_name;
