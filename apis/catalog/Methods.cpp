@@ -96,7 +96,7 @@ void List(APIRequest* request, APIResponse* response) {
             apis.append(Entry(known, description.name(), *description));
         }
     }
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }
 
 // An API that the caller may not call is as unknown as one that is not there.

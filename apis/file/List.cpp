@@ -179,7 +179,7 @@ void ListFolder(const Target& target, const Order& order, APIResponse* response)
     data["path"] = target.path;
     data["writable"] = target.writable;
     data["undecodable"] = static_cast<Json::UInt64>(undecodable);
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }
 
 // The shares that the caller may read, by name whatever the order asked for.
@@ -209,7 +209,7 @@ void ListTop(const APIRequest& request, const Order& order, APIResponse* respons
     data["path"] = "/";
     data["writable"] = false;
     data["undecodable"] = 0;
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }
 
 }  // namespace

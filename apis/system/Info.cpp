@@ -34,5 +34,5 @@ void Info(TALO::APIRequest*, TALO::APIResponse* response) {
     data["load"] = LoadAverages(facts);
     data["memory"]["total"] = Bytes(facts.totalram, facts);
     data["memory"]["free"] = Bytes(facts.freeram, facts);
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }

@@ -19,5 +19,5 @@ void Ping(APIRequest* request, TALO::APIResponse* response) {
     if (count.IsSet()) {
         data["count"] = count.Get();
     }
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }

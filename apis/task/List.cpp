@@ -60,5 +60,5 @@ void List(APIRequest* request, APIResponse* response) {
             ids = Json::Value(Json::arrayValue);
         }
     }
-    response->SetSuccess(tasks);
+    response->TakeSuccess(&tasks);
 }

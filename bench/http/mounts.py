@@ -6,6 +6,9 @@ import signal
 import sys
 
 MOUNTED = "WEBAPI_BENCH_MOUNTED"
+# What a service gets; a shell's environment would go through each request of some ways
+# to serve, and not of others.
+KEPT = ("PATH", "HOME", "LANG", "TMPDIR")
 
 
 def in_own_mounts(script, root, build):
@@ -26,7 +29,8 @@ def in_own_mounts(script, root, build):
                 f'shift 2 && exec {drop} "$@"')
     os.execvpe("unshare", [*unshare, "sh", "-c", commands, "sh", str(root), str(build),
                            sys.executable, "-B", os.path.abspath(script), *sys.argv[1:]],
-               {**os.environ, MOUNTED: "yes"})
+               {**{name: os.environ[name] for name in KEPT if name in os.environ},
+                MOUNTED: "yes"})
 
 
 def root_of(build):

@@ -25,5 +25,5 @@ void Rows(TALO::APIRequest* request, TALO::APIResponse* response) {
     }
     Json::Value data(Json::objectValue);
     data["rows"].swap(rows);
-    response->SetSuccess(data);
+    response->TakeSuccess(&data);
 }

@@ -40,6 +40,10 @@ class WEBAPI_EXPORT APIBase {
     /// `members` is no object or has no members.
     virtual bool SetData(const std::string& section, const Json::Value& members, bool stringOnly);
 
+    /// The same for an object that the caller can do without: its members are moved, not
+    /// copied, and what it has afterwards is of no meaning. It must be no part of the store.
+    bool TakeData(const std::string& section, Json::Value* members, bool stringOnly);
+
     /// Sets one key. False when the section does not exist or is no object, the
     /// key is empty, or `stringOnly` is set and the value is no JSON string.
     virtual bool SetData(const std::string& section, const std::string& key,

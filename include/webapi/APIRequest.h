@@ -50,6 +50,10 @@ class WEBAPI_EXPORT APIRequest {
     /// a filled object changes nothing.
     void InitEnv(const Json::Value& environ);
 
+    /// The same for an object that the caller can do without: nothing is copied, and
+    /// what it has afterwards is of no meaning.
+    void TakeEnv(Json::Value* environ);
+
     /// Merges "getParam" and then "postParam" of the document into the parameters,
     /// so that the body wins, and takes the API identity from both. With `clear`
     /// the parameters are emptied first. Throws as the constructor does.

@@ -46,6 +46,10 @@ class WEBAPI_EXPORT APIResponse {
     /// Replaces the result by {"success": true}, with "data" when not null.
     void SetSuccess(const Json::Value& data);
 
+    /// The same for data that the caller can do without, as the large reply of a list:
+    /// nothing is copied, and what it has afterwards is of no meaning.
+    void TakeSuccess(Json::Value* data);
+
     /// The code set last; 0 after a success or when nothing was set.
     int GetError() const;
 
@@ -91,8 +95,10 @@ class WEBAPI_EXPORT APIResponse {
     void SetHttpdRestart(bool restart);
     bool GetHttpdRestart() const;
 
-    /// The result document ({} while nothing was set) and the cookie lines.
+    /// The result document ({} while nothing was set) and the cookie lines. The
+    /// reference form is valid until the next result is set.
     Json::Value GetBody() const;
+    const Json::Value& GetBodyRef() const;
     Json::Value GetCookies() const;
 
     /// Work for after the reply, run in a detached process in the order of

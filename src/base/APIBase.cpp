@@ -31,24 +31,31 @@ bool APIBase::HasData(const std::string& section, const std::string& key) {
     return !key.empty() && FindMember(FindMember(&store, section), key) != nullptr;
 }
 
+// Copied first: `members` may be a part of what it replaces.
 bool APIBase::SetData(const std::string& section, const Json::Value& members, bool stringOnly) {
-    if (FindMember(&store, section) == nullptr || !members.isObject() || members.empty()) {
+    if (!members.isObject() || members.empty()) {
+        return false;
+    }
+    Json::Value taken(members);
+    return TakeData(section, &taken, stringOnly);
+}
+
+bool APIBase::TakeData(const std::string& section, Json::Value* members, bool stringOnly) {
+    if (FindMember(&store, section) == nullptr || !members->isObject() || members->empty()) {
         return false;
     }
     Json::Value& target = store[section];
     if (!target.isObject()) {
         return false;
     }
-    // Copied first: `members` may be a part of what it replaces.
-    Json::Value taken(members);
-    if (stringOnly && !AreStrings(taken)) {
-        KeepStrings(&taken);
+    if (stringOnly && !AreStrings(*members)) {
+        KeepStrings(members);
     }
     if (target.empty()) {
-        target.swap(taken);
+        target.swap(*members);
         return true;
     }
-    for (auto member = taken.begin(); member != taken.end(); ++member) {
+    for (auto member = members->begin(); member != members->end(); ++member) {
         target[member.name()].swap(*member);
     }
     return true;

@@ -45,7 +45,7 @@ void WebEntry::OutputHeader() {
 }
 
 void WebEntry::OutputBody() {
-    Write(toString(response->GetBody()));
+    Write(toString(response->GetBodyRef()));
     (void)std::fflush(stdout);
 }
 

@@ -104,7 +104,7 @@ int WebEntry::Initialize(const Json::Value&) {
         response->SetError(kErrorBadRequest, Json::Value());
         return 0;
     }
-    request->InitEnv(document);
+    request->TakeEnv(&document);
     document.clear();
     if (!InitParam(document)) {
         return 0;

@@ -47,7 +47,12 @@ APIRequest::~APIRequest() {
 }
 
 void APIRequest::InitEnv(const Json::Value& environ) {
-    if (!d->SetData("environ", environ, true)) {
+    Json::Value copy(environ);
+    TakeEnv(&copy);
+}
+
+void APIRequest::TakeEnv(Json::Value* environ) {
+    if (!d->TakeData("environ", environ, true)) {
         return;
     }
     d->InitCookie();
@@ -206,12 +211,14 @@ std::string APIRequest::GetGroupPreferenceDir(const std::string& group) const {
 }
 
 bool APIRequest::IsSliceUploadRequest() const {
-    const std::string type = ToText(d->GetData("environ", "HTTP_X_TYPE_NAME", ""));
+    const std::string type =
+        ToText(d->GetData("environ", "HTTP_X_TYPE_NAME", Json::Value::nullSingleton()));
     return strcasecmp(type.c_str(), "SLICEUPLOAD") == 0;
 }
 
 bool APIRequest::IsUploadRequest() const {
-    const std::string type = ToText(d->GetData("environ", "CONTENT_TYPE", ""));
+    const std::string type =
+        ToText(d->GetData("environ", "CONTENT_TYPE", Json::Value::nullSingleton()));
     return type.find("multipart/form-data") != std::string::npos || IsSliceUploadRequest();
 }
 

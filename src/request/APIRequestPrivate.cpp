@@ -5,11 +5,25 @@
 
 namespace TALO {
 
+namespace {
+
+// Copying them all is cheaper than making each.
+const Json::Value& EmptySections() {
+    static const Json::Value sections = [] {
+        Json::Value made(Json::objectValue);
+        for (const char* section :
+             {"environ", "cookie", "reqLib", "session", "param", "attr", "url", "userAgent"}) {
+            made[section] = Json::Value(Json::objectValue);
+        }
+        return made;
+    }();
+    return sections;
+}
+
+}  // namespace
+
 APIRequestPrivate::APIRequestPrivate(APIRequest* owner) : owner(owner) {
-    for (const char* section :
-         {"environ", "cookie", "reqLib", "session", "param", "attr", "url", "userAgent"}) {
-        store[section] = Json::Value(Json::objectValue);
-    }
+    store = EmptySections();
 }
 
 APIRequestPrivate::~APIRequestPrivate() = default;

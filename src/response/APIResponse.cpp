@@ -2,6 +2,7 @@
 
 #include <sstream>
 
+#include "src/base/ErrorCode.h"
 #include "src/base/JsonConvert.h"
 #include "src/response/APIResponsePrivate.h"
 
@@ -31,7 +32,11 @@ void APIResponse::SetError(int code, const Json::Value& details) {
 }
 
 void APIResponse::SetSuccess(const Json::Value& data) {
-    d->SetError(0, data);
+    d->SetError(kErrorNone, data);
+}
+
+void APIResponse::TakeSuccess(Json::Value* data) {
+    d->TakeResult(kErrorNone, data);
 }
 
 int APIResponse::GetError() const {
@@ -102,7 +107,12 @@ bool APIResponse::GetHttpdRestart() const {
 }
 
 Json::Value APIResponse::GetBody() const {
-    return d->GetData("body", "", Json::Value(Json::objectValue));
+    return GetBodyRef();
+}
+
+const Json::Value& APIResponse::GetBodyRef() const {
+    static const Json::Value nothing(Json::objectValue);
+    return d->GetData("body", "", nothing);
 }
 
 Json::Value APIResponse::GetCookies() const {

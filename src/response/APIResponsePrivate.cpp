@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "platform/Task.h"
+#include "src/base/ErrorCode.h"
 #include "src/base/JsonConvert.h"
 #include "webapi/APIRequest.h"
 
@@ -39,18 +40,24 @@ void APIResponsePrivate::RecordResult() {
     }
 }
 
+// Copied first: the details may be a part of the body that goes.
 void APIResponsePrivate::SetError(int code, const Json::Value& details) {
+    Json::Value copy(details);
+    TakeResult(code, &copy);
+}
+
+void APIResponsePrivate::TakeResult(int code, Json::Value* details) {
     OpenTask();
-    // Built aside first: the details may be a part of the body that goes.
     Json::Value body(Json::objectValue);
-    body["success"] = code == 0;
-    if (code != 0) {
-        body["error"]["code"] = code;
-        if (!details.isNull()) {
-            body["error"]["errors"] = details;
+    body["success"] = code == kErrorNone;
+    if (code != kErrorNone) {
+        Json::Value& about = body["error"];
+        about["code"] = code;
+        if (!details->isNull()) {
+            about["errors"].swap(*details);
         }
-    } else if (!details.isNull()) {
-        body["data"] = details;
+    } else if (!details->isNull()) {
+        body["data"].swap(*details);
     }
     store["body"].swap(body);
     error = code;

@@ -18,6 +18,7 @@ class APIResponsePrivate : public APIBase {
     virtual ~APIResponsePrivate();
 
     void SetError(int code, const Json::Value& details);
+    void TakeResult(int code, Json::Value* details);
     // Zero minutes keep the cookie for the browser session, negative ones delete
     // it. Mind the order: the public form takes the path first.
     bool AddCookie(const std::string& name, const std::string& value, const std::string& path,

@@ -64,7 +64,7 @@ int APIRunner::Initialize(const Json::Value& document) {
         response->SetError(kErrorBadRequest, Json::Value());
         return 0;
     }
-    request->InitEnv(environment);
+    request->TakeEnv(&environment);
     if (const Json::Value* given = FindMember(&document, "environ")) {
         request->InitEnv(*given);
     }
@@ -109,7 +109,7 @@ int APIRunner::InitEnv(Json::Value& environment) {
     for (char** entry = environ; entry != nullptr && *entry != nullptr; ++entry) {
         const char* equals = std::strchr(*entry, '=');
         if (equals != nullptr) {
-            environment[std::string(*entry, static_cast<size_t>(equals - *entry))] = equals + 1;
+            *environment.demand(*entry, equals) = equals + 1;
         }
     }
     return 1;

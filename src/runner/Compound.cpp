@@ -99,7 +99,7 @@ int APIRunner::HandleCompound(APIRequest* request, APIResponse* response) {
     }
     result["has_fail"] = failed;
     response->SetCallbackFuncs(answer->GetCallbackFuncs());
-    response->SetSuccess(result);
+    response->TakeSuccess(&result);
     return 1;
 }
 

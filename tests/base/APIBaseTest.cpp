@@ -223,4 +223,35 @@ TEST_F(KeyedStore, SetsAKeyToAPartOfItself) {
     EXPECT_EQ(sections.Known(), Parse(R"({"a": {"c": 3}})"));
 }
 
+TEST_F(KeyedStore, TakesMembersAsItSetsThem) {
+    ASSERT_TRUE(sections.SetData("known", Parse(R"({"a": 1, "b": 2})"), false));
+    Json::Value members = Parse(R"({"b": "new", "c": [3]})");
+    EXPECT_TRUE(sections.TakeData("known", &members, false));
+    EXPECT_EQ(sections.Known(), Parse(R"({"a": 1, "b": "new", "c": [3]})"));
+    members = Parse(R"({"c": 4, "d": "text"})");
+    EXPECT_TRUE(sections.TakeData("known", &members, true));
+    EXPECT_EQ(sections.Known(), Parse(R"({"a": 1, "b": "new", "c": [3], "d": "text"})"));
+}
+
+TEST_F(KeyedStore, TakesWithoutACopy) {
+    Json::Value members(Json::objectValue);
+    members["a"] = std::string(1000, 'a');
+    const char* const text = members["a"].asCString();
+    ASSERT_TRUE(sections.TakeData("known", &members, true));
+    EXPECT_EQ(sections.GetData("known", "a", Json::Value()).asCString(), text);
+}
+
+TEST_F(KeyedStore, TakesNothingThatItWouldNotSet) {
+    for (const char* text : {"{}", "[1]", "null", "\"text\""}) {
+        Json::Value members = Parse(text);
+        EXPECT_FALSE(sections.TakeData("known", &members, false)) << text;
+    }
+    for (const char* section : {"unknown", "list", ""}) {
+        Json::Value members = Parse(R"({"a": 1})");
+        EXPECT_FALSE(sections.TakeData(section, &members, false)) << section;
+        EXPECT_EQ(members, Parse(R"({"a": 1})"));
+    }
+    EXPECT_EQ(sections.Everything(), untouched);
+}
+
 }  // namespace

@@ -26,6 +26,17 @@ TEST(Environment, GrowsAndOverwrites) {
     EXPECT_EQ(request.GetEnv("", Json::Value()), Parse(R"({"a": "1", "b": "3", "c": "4"})"));
 }
 
+TEST(Environment, TakesVariablesAsItAddsThem) {
+    APIRequest request(Parse(R"({"environ": {"a": "1", "b": "2"}})"));
+    Json::Value variables = Parse(R"({"b": "3", "n": 5, "HTTP_COOKIE": "c=4",
+                                      "REQUEST_METHOD": "POST"})");
+    request.TakeEnv(&variables);
+    EXPECT_EQ(request.GetEnv("", Json::Value()),
+              Parse(R"({"a": "1", "b": "3", "HTTP_COOKIE": "c=4", "REQUEST_METHOD": "POST"})"));
+    EXPECT_EQ(request.GetCookie("c", ""), "4");
+    EXPECT_EQ(request.GetRequestMethod(), 2);
+}
+
 TEST(Environment, StaysAsItIsForAnythingButAFilledObject) {
     APIRequest request(Parse(R"({"environ": {"HTTP_COOKIE": "a=1", "REQUEST_METHOD": "GET"}})"));
     request.SetCookie("a", "changed");

@@ -103,4 +103,26 @@ TEST_F(ResponseResult, MakesNoTaskHandleForAnOrdinaryRequest) {
     EXPECT_EQ(ordinary.GetError(), 101);
 }
 
+TEST_F(ResponseResult, TakesDataAsItSetsThem) {
+    Json::Value data(Json::objectValue);
+    data["text"] = std::string(1000, 'a');
+    const char* const text = data["text"].asCString();
+    response.SetError(105, Json::Value());
+    response.TakeSuccess(&data);
+    EXPECT_EQ(response.GetError(), 0);
+    EXPECT_EQ(response.GetBodyRef().size(), 2u);
+    EXPECT_EQ(response.GetBodyRef()["success"], Json::Value(true));
+    EXPECT_EQ(response.GetBodyRef()["data"]["text"].asCString(), text) << "a copy";
+    Json::Value nothing;
+    response.TakeSuccess(&nothing);
+    EXPECT_EQ(response.GetBody(), Parse(R"({"success": true})"));
+}
+
+TEST_F(ResponseResult, ShowsItsBodyWithoutACopy) {
+    EXPECT_EQ(response.GetBodyRef(), Json::Value(Json::objectValue)) << "nothing is set";
+    response.SetError(400, "which");
+    EXPECT_EQ(response.GetBodyRef(), response.GetBody());
+    EXPECT_EQ(&response.GetBodyRef(), &response.GetBodyRef());
+}
+
 }  // namespace
