@@ -20,14 +20,13 @@ const char kTimedOutText[] = "timeout";
 const char kRefusedText[] = "noprivilege";
 const char kNoSessionText[] = "unauth";
 
-void GiveSessionFacts(APIRequest* request, const std::string& id) {
-    talo::Session session;
+void GiveSessionFacts(APIRequest* request, const std::string& id, talo::Session* session) {
     talo::Account account;
     Json::Value facts(Json::objectValue);
-    if (talo::FindSession(id, &session) && talo::FindAccount(session.user, &account)) {
-        facts["username"] = session.user;
+    if (talo::FindSession(id, session) && talo::FindAccount(session->user, &account)) {
+        facts["username"] = session->user;
         facts["isAdmin"] = talo::IsAdministrator(account);
-        facts["timeout"] = session.timeout > 0 ? session.timeout : talo::DefaultTimeout();
+        facts["timeout"] = session->timeout > 0 ? session->timeout : talo::DefaultTimeout();
         facts["isTimeout"] = false;
         facts["isAuthorized"] = true;
     }
@@ -43,7 +42,8 @@ bool RequireSession(APIRequest* request, APIResponse* response, SessionUse use) 
         response->SetServerError(kNoSessionText);
         return false;
     }
-    GiveSessionFacts(request, id);
+    talo::Session session;
+    GiveSessionFacts(request, id, &session);
     if (!TALO::APIAuth::CheckPermission(request, response, id.c_str(),
                                         use == SessionUse::kEvenTimedOut)) {
         request->InitSession(Json::Value());
@@ -51,7 +51,7 @@ bool RequireSession(APIRequest* request, APIResponse* response, SessionUse use) 
         return false;
     }
     if (use == SessionUse::kRenew) {
-        (void)talo::RenewSession(id);
+        (void)talo::RenewSession(id, &session);
     }
     return true;
 }

@@ -2,6 +2,8 @@
 
 #include <strings.h>
 
+#include <string_view>
+
 #include "platform/System.h"
 #include "src/base/JsonConvert.h"
 #include "src/request/APIRequestPrivate.h"
@@ -15,6 +17,14 @@ typedef int (*PreferenceDirGet)(const char* name, char* buffer, size_t size);
 std::string PreferenceDir(PreferenceDirGet get, const std::string& name) {
     char path[1024] = {};
     return get(name.c_str(), path, sizeof path) < 0 ? "/tmp" : path;
+}
+
+// Of a text, without a copy, and a zero byte follows; "" of anything else.
+std::string_view TextIn(const Json::Value& value) {
+    const char* begin = "";
+    const char* end = begin;
+    (void)value.getString(&begin, &end);
+    return std::string_view(begin, static_cast<size_t>(end - begin));
 }
 
 }  // namespace
@@ -211,15 +221,15 @@ std::string APIRequest::GetGroupPreferenceDir(const std::string& group) const {
 }
 
 bool APIRequest::IsSliceUploadRequest() const {
-    const std::string type =
-        ToText(d->GetData("environ", "HTTP_X_TYPE_NAME", Json::Value::nullSingleton()));
-    return strcasecmp(type.c_str(), "SLICEUPLOAD") == 0;
+    const Json::Value& none = Json::Value::nullSingleton();
+    const std::string_view type = TextIn(d->GetData("environ", "HTTP_X_TYPE_NAME", none));
+    return strcasecmp(type.data(), "SLICEUPLOAD") == 0;
 }
 
 bool APIRequest::IsUploadRequest() const {
-    const std::string type =
-        ToText(d->GetData("environ", "CONTENT_TYPE", Json::Value::nullSingleton()));
-    return type.find("multipart/form-data") != std::string::npos || IsSliceUploadRequest();
+    const Json::Value& none = Json::Value::nullSingleton();
+    const std::string_view type = TextIn(d->GetData("environ", "CONTENT_TYPE", none));
+    return type.find("multipart/form-data") != std::string_view::npos || IsSliceUploadRequest();
 }
 
 bool APIRequest::IsPollingTask() const {

@@ -1,8 +1,11 @@
 #include <sys/prctl.h>
 #include <syslog.h>
 
+#include <algorithm>
 #include <cctype>
-#include <cstdio>
+#include <cstddef>
+#include <cstring>
+#include <string>
 
 #include "src/base/ErrorCode.h"
 #include "src/base/Log.h"
@@ -21,12 +24,18 @@ char taskName[17];
 
 // API and method are the client's text: a line break in one must not begin a
 // line of its own in the log.
-void ReplaceControls(char* text) {
-    for (; *text != '\0'; ++text) {
-        if (std::iscntrl(static_cast<unsigned char>(*text))) {
-            *text = '?';
-        }
-    }
+std::string WithoutControls(std::string text) {
+    std::replace_if(
+        text.begin(), text.end(), [](unsigned char byte) { return std::iscntrl(byte) != 0; }, '?');
+    return text;
+}
+
+// As much as there is room for.
+template <size_t Size>
+void Write(const std::string& text, char (&to)[Size]) {
+    const size_t size = std::min(text.size(), Size - 1);
+    std::memcpy(to, text.data(), size);
+    to[size] = '\0';
 }
 
 void IdentifyToLog() {
@@ -42,15 +51,14 @@ int APIRunner::SetProcessName(APIRequest* request, APIResponse* response) {
         response->SetError(kErrorBadRequest, Json::Value());
         return 0;
     }
-    const std::string method = request->GetAPIMethod();
-    const int version = request->GetAPIVersion();
-    (void)snprintf(logIdentity, sizeof logIdentity, "%s_%s[%d].%s", d->GetProcName().c_str(),
-                   api.c_str(), version, method.c_str());
-    ReplaceControls(logIdentity);
+    // Each ends at a zero byte that it may have.
+    const std::string call =
+        WithoutControls(std::string(api.c_str()) + "[" + std::to_string(request->GetAPIVersion()) +
+                        "]." + request->GetAPIMethod().c_str());
+    Write(WithoutControls(d->GetProcName().c_str()) + "_" + call, logIdentity);
     IdentifyToLog();
     d->SetArgv0(logIdentity);
-    (void)snprintf(taskName, sizeof taskName, "%s[%d].%s", api.c_str(), version, method.c_str());
-    ReplaceControls(taskName);
+    Write(call, taskName);
     if (prctl(PR_SET_NAME, taskName) != 0) {
         response->SetError(kErrorProcessName, Json::Value());
         LOG_ERROR("Set process name fail[%m]");
@@ -67,9 +75,9 @@ void RestoreProcessName(APIRunnerPrivate* d) {
     const std::string& name = d->GetOrigProcName();
     d->SetArgv0(name);
     d->LeaveArgv0();
-    (void)snprintf(logIdentity, sizeof logIdentity, "%s", name.c_str());
+    Write(name, logIdentity);
     IdentifyToLog();
-    (void)snprintf(taskName, sizeof taskName, "%s", name.c_str());
+    Write(name, taskName);
     (void)prctl(PR_SET_NAME, taskName);
 }
 

@@ -226,15 +226,18 @@ bool FindSession(const std::string& id, Session* session) {
     return host::ReadSession(id, session);
 }
 
-// Read first: touching follows links and takes folders. Only the time is another
-// afterwards. It counts in seconds: with each touch all other processes would read
-// the file again.
 bool RenewSession(const std::string& id) {
     Session session;
-    if (!host::ReadSession(id, &session)) {
+    return host::ReadSession(id, &session) && RenewSession(id, &session);
+}
+
+// Touching follows links and takes folders. Only the time is another afterwards. It
+// counts in seconds: with each touch all other processes would read the file again.
+bool RenewSession(const std::string& id, Session* found) {
+    if (!IsSessionId(id)) {
         return false;
     }
-    if (session.lastUse == time(nullptr)) {
+    if (found->lastUse == time(nullptr)) {
         return true;
     }
     const std::string path = host::PathOf(id);
@@ -242,8 +245,8 @@ bool RenewSession(const std::string& id) {
         return false;
     }
     const host::FileState now(path);
-    session.lastUse = now.Facts().st_mtime;
-    host::LastSession().Keep(id, now, session);
+    found->lastUse = now.Facts().st_mtime;
+    host::LastSession().Keep(id, now, *found);
     return true;
 }
 

@@ -41,8 +41,10 @@ TALO_PLATFORM bool CreateSession(const Session& session, std::string* id);
 
 TALO_PLATFORM bool FindSession(const std::string& id, Session* session);
 
-// Sets the last use to now. False when there is no such session.
+// Sets the last use to now. False when there is no such session. The second form is
+// for who has found it in the same request already, and spares another look.
 TALO_PLATFORM bool RenewSession(const std::string& id);
+TALO_PLATFORM bool RenewSession(const std::string& id, Session* found);
 
 // Ends a session, by its id or by its handle.
 TALO_PLATFORM bool EndSession(const std::string& id);

@@ -79,6 +79,20 @@ TEST_F(SessionStore, RenewsTheLastUseAndNothingElse) {
     EXPECT_EQ(Read(id), record);
 }
 
+TEST_F(SessionStore, RenewsOneThatWasFound) {
+    const std::string id = Open();
+    LeaveUnused(id, 1000);
+    talo::Session found = Found(id);
+    const long long before = time(nullptr);
+    EXPECT_TRUE(talo::RenewSession(id, &found));
+    EXPECT_GE(found.lastUse, before - 1);
+    EXPECT_EQ(Found(id).lastUse, found.lastUse);
+    found.lastUse = 0;
+    EXPECT_FALSE(talo::RenewSession("../session", &found)) << "no id at all";
+    ASSERT_TRUE(talo::EndSession(id));
+    EXPECT_FALSE(talo::RenewSession(id, &found));
+}
+
 // Others that have read it need not read it again.
 TEST_F(SessionStore, LeavesATimeOfThisSecondAlone) {
     const std::string id = Open();
