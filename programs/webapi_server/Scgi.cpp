@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <limits>
+#include <string_view>
 
 #include "programs/webapi_server/Clock.h"
 
@@ -126,14 +127,14 @@ ScgiResult ReadLength(Source* source, size_t limit, Frame* frame, std::string* r
     }
 }
 
-bool IsName(const std::string& name) {
+bool IsName(std::string_view name) {
     return !name.empty() && std::none_of(name.begin(), name.end(), [](char byte) {
         const auto code = static_cast<unsigned char>(byte);
         return byte == '=' || code < 0x20 || code == 0x7f;
     });
 }
 
-bool IsLength(const std::string& value) {
+bool IsLength(std::string_view value) {
     constexpr size_t kMostDigits = sizeof kMostLength - 1;
     return !value.empty() && std::all_of(value.begin(), value.end(), IsDigit) &&
            (value.size() < kMostDigits || (value.size() == kMostDigits && value <= kMostLength));
@@ -169,25 +170,33 @@ ScgiResult SettleLength(std::vector<std::string>* variables, std::string* reason
 }
 
 // The piece that begins there, up to its NUL; `at` moves behind it.
-bool NextPiece(const std::string& block, size_t* at, std::string* piece) {
+bool NextPiece(std::string_view block, size_t* at, std::string_view* piece) {
     const size_t end = block.find('\0', *at);
-    if (end == std::string::npos) {
+    if (end == std::string_view::npos) {
         return false;
     }
-    piece->assign(block, *at, end - *at);
+    *piece = block.substr(*at, end - *at);
     *at = end + 1;
     return true;
 }
 
+std::string Variable(std::string_view name, std::string_view value) {
+    std::string variable;
+    variable.reserve(name.size() + 1 + value.size());
+    return variable.append(name).append(1, '=').append(value);
+}
+
 // Repeated names are left as they come, but for the two that frame the request:
 // clients may repeat a header of their own.
-ScgiResult ParseBlock(const std::string& block, std::vector<std::string>* variables,
+ScgiResult ParseBlock(std::string_view block, std::vector<std::string>* variables,
                       std::string* reason) {
+    constexpr size_t kUsualCount = 32;
     std::vector<std::string> found;
+    found.reserve(kUsualCount);
     bool hasVersion = false;
     for (size_t at = 0; at < block.size();) {
-        std::string name;
-        std::string value;
+        std::string_view name;
+        std::string_view value;
         if (!NextPiece(block, &at, &name) || !NextPiece(block, &at, &value)) {
             return Malformed(reason, "a variable is cut off");
         }
@@ -207,8 +216,7 @@ ScgiResult ParseBlock(const std::string& block, std::vector<std::string>* variab
             }
             hasVersion = true;
         }
-        name += '=';
-        found.push_back(name + value);
+        found.push_back(Variable(name, value));
     }
     if (!hasVersion) {
         return Malformed(reason, found.empty() ? "there are no variables" : "SCGI is missing");
@@ -241,7 +249,6 @@ ScgiResult ReadScgiRequest(int connection, const ScgiLimits& limits,
     if (block.back() != ',') {
         return Malformed(reason, "no comma follows the block");
     }
-    block.pop_back();
-    block.erase(0, frame.lead);
-    return ParseBlock(block, variables, reason);
+    const std::string_view inner(block.data() + frame.lead, block.size() - frame.lead - 1);
+    return ParseBlock(inner, variables, reason);
 }
