@@ -5,6 +5,7 @@
 #include <stdio.h>
 #include <stdio_ext.h>
 #include <stdlib.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <atomic>
@@ -80,6 +81,13 @@ void AnswerAtExit() {
     }
 }
 
+// The system's own, which calls no handlers.
+[[noreturn]] void EndAtOnce(int status) {
+    for (;;) {
+        (void)syscall(SYS_exit_group, status);
+    }
+}
+
 void InstallStack() {
     stack_t ours = {};
     ours.ss_sp = stack;
@@ -116,6 +124,17 @@ void BeginCrashReply(volatile sig_atomic_t* begun) {
         (void)sigaction(kSignals[index], &action, &actionsBefore[index]);
     }
     armed = true;
+}
+
+// The program comes before the C library where a method's call is bound.
+__attribute__((visibility("default"))) void _exit(int status) {
+    AnswerAtExit();
+    EndAtOnce(status);
+}
+
+__attribute__((visibility("default"))) void _Exit(int status) noexcept {
+    AnswerAtExit();
+    EndAtOnce(status);
 }
 
 // Also the action that a method has put in place of ours goes.

@@ -13,7 +13,7 @@ CACHE_LINES = [
 class Crashes(TaskCase):
     def ways(self):
         """A sanitizer reports what it takes for a fault, and that is no fault of ours."""
-        ways = ["abort", "thread", "exit"]
+        ways = ["abort", "thread", "exit", "_exit"]
         if not self.is_sanitized():
             ways += ["segfault", "bus", "divide", "illegal", "overflow", "killed"]
         return ways

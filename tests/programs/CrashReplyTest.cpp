@@ -84,7 +84,9 @@ TEST_P(EveryCrash, OfAForkedChildIsNotAnswered) {
             _exit(0);
         }
         int status = 0;
-        return waitpid(child, &status, 0) == child && status != 0 && begun == 0 ? 7 : 8;
+        const bool crashed = waitpid(child, &status, 0) == child && status != 0;
+        EndCrashReply();
+        return crashed && begun == 0 ? 7 : 8;
     });
     EXPECT_EQ(result.output, "");
     EXPECT_EQ(result.status, 7);
@@ -124,6 +126,35 @@ TEST(CrashReply, AnswersForAMethodThatExits) {
     });
     EXPECT_EQ(result.output, Reply());
     EXPECT_EQ(result.status, 5);
+}
+
+TEST(CrashReply, AnswersForAMethodThatEndsPastAllHandlers) {
+    void (*const ends[])(int) = {_exit, _Exit};
+    for (const auto end : ends) {
+        const ChildResult result = InChild([end]() -> int {
+            BeginCrashReply(&begun);
+            end(5);
+            return 6;
+        });
+        EXPECT_EQ(result.output, Reply());
+        EXPECT_EQ(result.status, 5);
+    }
+}
+
+TEST(CrashReply, LeavesTheEndOfAChildToTheChild) {
+    const ChildResult result = InChild([] {
+        BeginCrashReply(&begun);
+        const pid_t child = fork();
+        if (child == 0) {
+            _exit(3);
+        }
+        int status = 0;
+        const bool ended = waitpid(child, &status, 0) == child && WEXITSTATUS(status) == 3;
+        EndCrashReply();
+        return ended ? 7 : 8;
+    });
+    EXPECT_EQ(result.output, "");
+    EXPECT_EQ(result.status, 7);
 }
 
 TEST(CrashReply, TakesTheBufferOfAMethodThatExitsForItsReply) {

@@ -83,9 +83,11 @@ class CrashReply(unittest.TestCase):
         result = self.call("download", "exit")
         self.assertTrue(result.stdout.endswith(b"half a file"), result)
 
-    def test_after_an_immediate_exit_nobody_is_left_to_answer(self):
+    def test_a_method_that_exits_past_all_handlers_is_answered(self):
         result = self.call("crash", "_exit")
-        self.assertEqual((result.stdout, result.returncode), (b"", 0))
+        self.assertEqual((result.stdout, result.returncode), (REPLY, 0))
+        result = self.call("download", "_exit")
+        self.assertEqual(result.stdout, b"Content-type: text/plain\r\n\r\nhalf a file")
 
     def test_a_crash_of_a_child_is_none_of_the_clients_business(self):
         for how in [*CRASHES, "exit", "_exit"]:
