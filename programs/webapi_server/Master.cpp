@@ -48,8 +48,8 @@ Master::Master(Listener& listener, const Settings& settings, const OriginalProce
       slots_(2 * settings.maxWorkers),
       queue_(settings.queue),
       farewell_(poller_),
-      workers_(poller_, taken_, slots_, settings, queue_, farewell_),
-      templates_(poller_, {listener, taken_, slots_, settings, original}, workers_),
+      workers_(poller_, slots_, settings, queue_, farewell_),
+      templates_(poller_, {listener, slots_, settings, original}, workers_),
       now_(MillisecondsNow()) {
     workers_.SetTemplates(&templates_);
 }
@@ -99,8 +99,8 @@ bool Master::Run() {
 bool Master::Begin() {
     const sigset_t signals = SignalsOfMaster();
     signals_ = signalfd(-1, &signals, SFD_CLOEXEC | SFD_NONBLOCK);
-    isAccepting_ = signals_ >= 0 && slots_.IsMapped() && taken_.IsOpen() &&
-                   poller_.Add(signals_, {Source::kSignals, 0, 0});
+    isAccepting_ =
+        signals_ >= 0 && slots_.IsMapped() && poller_.Add(signals_, {Source::kSignals, 0, 0});
     WatchClients(isAccepting_);
     if (isWatching_) {
         templates_.Reload("start", now_);
@@ -121,8 +121,8 @@ void Master::WatchClients(bool wanted) {
 // next worker that is done, and nobody is woken. As soon as one finds nobody there,
 // or is not done for some time, the master looks at the socket again.
 void Master::ShareClients() {
+    workers_.Follow(now_);
     if (!isWatching_) {
-        workers_.ReadTaken(now_);
         WatchClients(isAccepting_ && workers_.MayBegin(now_));
     }
     workers_.LetTake(isAccepting_ && !isWatching_ && queue_.Size() == 0);
@@ -279,7 +279,8 @@ void Master::Tick() {
 int Master::MillisecondsToWait() const {
     const bool isQuiet = !workers_.AreBusy() && queue_.Size() == 0 && farewell_.IsEmpty() &&
                          drainUntil_ == 0 && isAccepting_ && templates_.Generation() != 0;
-    if ((isAccepting_ && !isWatching_) || (queue_.Size() > 0 && workers_.HaveIdle())) {
+    if ((isAccepting_ && !isWatching_) || workers_.IsBehind() ||
+        (queue_.Size() > 0 && workers_.HaveIdle())) {
         return kLookAgain;
     }
     const long long until = isQuiet ? nextTick_ - kTick + kIdleTick : nextTick_;

@@ -44,7 +44,6 @@ class Master {
 
     Listener& listener_;
     Poller poller_;
-    TakenChannel taken_;
     SlotTable slots_;
     ConnectionQueue queue_;
     Farewell farewell_;

@@ -26,7 +26,8 @@ struct PooledWorker {
     pid_t pid = 0;
     int process = -1;  // its process descriptor
     int control = -1;
-    int connection = -1;  // of the request that it has
+    int connection = -1;  // of the request that it has, where the master has it too
+    unsigned takes = 0;   // as its slot told when that was looked at last
     int returns = 0;      // of that, from workers before
     bool isTimedOut = false;
     bool isUnanswered = false;  // its last request

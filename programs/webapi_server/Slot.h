@@ -17,19 +17,14 @@ struct Slot {
     volatile sig_atomic_t answerBegun;  // the first byte of the reply is about to leave
     char api[128];                      // zero-terminated, for the log
     std::atomic<int> mayTake;           // 1: when done, a worker may take who connects by itself
-    std::atomic<long long> takenAt;     // when it last did, CLOCK_MONOTONIC ms
+    std::atomic<unsigned> takes;        // how often it has since the master handed over
+    std::atomic<long long> takenAt;     // the last time, CLOCK_MONOTONIC ms
+    std::atomic<int> connection;        // the descriptor of whom it took; 0 when done
 };
 
 // The control socket (SOCK_SEQPACKET) between the two. The master sends kServe with
 // the connection as its ancillary descriptor, or kLeave; the worker sends kIdle when
 // it is ready for another request. A worker that ends just closes its side.
 enum ControlMessage : char { kServe = 's', kLeave = 'l', kIdle = 'i' };
-
-// What a worker that took a connection by itself tells the master, with the connection
-// as ancillary descriptor. All workers tell it over one socket (SOCK_SEQPACKET).
-struct TakenReport {
-    int slot;
-    unsigned serial;
-};
 
 #endif

@@ -7,7 +7,7 @@
 namespace {
 
 int OutOfTheWay(int descriptor) {
-    return fcntl(descriptor, F_DUPFD_CLOEXEC, kTakenSocket + 1);
+    return fcntl(descriptor, F_DUPFD_CLOEXEC, kListenerSocket + 1);
 }
 
 void Put(int descriptor, int number) {
@@ -21,11 +21,9 @@ void Put(int descriptor, int number) {
 void KeepOnly(const Sockets& sockets) {
     closelog();
     const int listener = sockets.listener >= 0 ? sockets.listener : STDIN_FILENO;
-    const Sockets aside = {OutOfTheWay(sockets.control), OutOfTheWay(listener),
-                           OutOfTheWay(sockets.taken)};
-    (void)close_range(kControlSocket, kTakenSocket, 0);
+    const Sockets aside = {OutOfTheWay(sockets.control), OutOfTheWay(listener)};
+    (void)close_range(kControlSocket, kListenerSocket, 0);
     Put(aside.control, kControlSocket);
     Put(aside.listener, kListenerSocket);
-    Put(aside.taken, kTakenSocket);
-    (void)close_range(kTakenSocket + 1, ~0U, 0);
+    (void)close_range(kListenerSocket + 1, ~0U, 0);
 }

@@ -4,12 +4,10 @@
 // The descriptors of what was forked off the master: no others, and no connection.
 constexpr int kControlSocket = 3;   // to the master, of this process alone
 constexpr int kListenerSocket = 4;  // where the web server connects
-constexpr int kTakenSocket = 5;     // for a TakenReport
 
 struct Sockets {
     int control;
     int listener;  // -1 where there is none any more
-    int taken;
 };
 
 // Gives them these numbers, and closes all other descriptors but the standard ones.

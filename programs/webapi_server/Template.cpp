@@ -137,17 +137,15 @@ bool Nursery::Start(const StartOrder& order, int workerControl) {
 void Nursery::BecomeWorker(const StartOrder& order, int control) {
     // What it starts and does not detach can be ended with it.
     (void)setpgid(0, 0);
-    KeepOnly({control, kListenerSocket, kTakenSocket});
+    KeepOnly({control, kListenerSocket});
     const TemplateTask task = task_;
     task.slots->KeepOnly(order.slot);
     (void)setrlimit(RLIMIT_NOFILE, &task.original->files);
     (void)sigprocmask(SIG_SETMASK, &task.original->mask, nullptr);
     Slot* const slot = task.slots->At(order.slot);
     slot->pid = getpid();
-    const WorkerTask worker = {
-        kControlSocket, kListenerSocket, kTakenSocket, {order.slot, order.serial}, slot};
     // Not _exit: the end of a process is part of what a library may rely on.
-    exit(RunWorker(worker, *task.settings));
+    exit(RunWorker({kControlSocket, kListenerSocket, slot}, *task.settings));
 }
 
 void Nursery::ReportEnded() {

@@ -133,7 +133,7 @@ void Templates::Launch(long long now) {
     const bool loadsLibraries = !libraryFailed_;
     const pid_t pid = fork();
     if (pid == 0) {
-        RunTemplate({{ends[1], inherited_.listener.Get(), inherited_.taken.WorkersEnd()},
+        RunTemplate({{ends[1], inherited_.listener.Get()},
                      inherited_.listener.IsOwn(),
                      &inherited_.slots,
                      &inherited_.settings,

@@ -9,7 +9,6 @@
 #include "programs/webapi_server/Listen.h"
 #include "programs/webapi_server/Message.h"
 #include "programs/webapi_server/Poller.h"
-#include "programs/webapi_server/TakenChannel.h"
 #include "programs/webapi_server/Template.h"
 
 // What the templates tell.
@@ -28,7 +27,6 @@ class TemplateEvents {
 // What a template gets of the master.
 struct Inherited {
     const Listener& listener;
-    const TakenChannel& taken;
     SlotTable& slots;
     const Settings& settings;
     const OriginalProcess& original;

@@ -36,10 +36,10 @@ namespace {
 
 // A child of a method's must neither keep the master waiting for this worker's
 // end nor speak for it.
-WorkerTask taskInChildren = {-1, -1, -1, {}, nullptr};
+WorkerTask taskInChildren = {-1, -1, nullptr};
 
 void LeaveSocketsInChild() {
-    for (int* socket : {&taskInChildren.control, &taskInChildren.listener, &taskInChildren.taken}) {
+    for (int* socket : {&taskInChildren.control, &taskInChildren.listener}) {
         if (*socket >= 0) {
             (void)close(*socket);
             *socket = -1;
@@ -164,6 +164,7 @@ class Worker {
     bool AwaitConnection(int* connection) const;
 
     void TakeConnection(int connection);
+    void TakeRest(int connection) const;
     void EndReply() const;
     void EndConnection() const;
 
@@ -190,7 +191,8 @@ class Worker {
 };
 
 // While requests wait, neither this nor the master has to be woken for the next one.
-// The master learns of it before anything is done: it answers for a worker that dies.
+// The master sees that it was taken when it looks, and helps itself to the connection
+// if that lasts.
 bool Worker::Take(int* connection) const {
     if (slot_->mayTake == 0) {
         return false;
@@ -201,7 +203,8 @@ bool Worker::Take(int* connection) const {
     }
     slot_->answerBegun = 0;
     slot_->takenAt = MillisecondsNow();
-    (void)SendMessage(task_.taken, &task_.identity, sizeof task_.identity, *connection, 0);
+    slot_->connection = *connection;
+    ++slot_->takes;
     return true;
 }
 
@@ -243,10 +246,22 @@ bool Worker::Serve(int connection) {
         slot_->answerBegun = 1;
         SendAll(connection, ReplyFor(ReplyStatus::kBadRequest));
     }
+    if (slot_->connection != 0) {
+        TakeRest(connection);
+    }
     (void)shutdown(connection, SHUT_RDWR);
+    slot_->connection = 0;
     (void)close(connection);
     slot_->began = 0;
     return true;
+}
+
+// Of a connection that the master handed over it does that.
+void Worker::TakeRest(int connection) const {
+    (void)shutdown(connection, SHUT_WR);
+    (void)dup2(connection, STDIN_FILENO);
+    DiscardInput(true);
+    nowhere_.TakeInput();
 }
 
 // Each end of input or output wakes the web server: where there is no body, nothing is
@@ -254,6 +269,9 @@ bool Worker::Serve(int connection) {
 void Worker::TakeConnection(int connection) {
     hasBody_ = LengthOfBody() > 0;
     (void)dup2(connection, STDOUT_FILENO);
+    if (slot_->connection != 0) {
+        slot_->connection = STDOUT_FILENO;
+    }
     if (hasBody_) {
         (void)dup2(connection, STDIN_FILENO);
         EndInputBehindBody();
@@ -288,6 +306,7 @@ bool Worker::ServeRead() {
     const bool livesOn = Run();
     EndCrashReply();
     EndConnection();
+    slot_->connection = 0;
     nowhere_.Take();
     const bool back = livesOn && PutBack();
     slot_->began = 0;
@@ -345,6 +364,6 @@ int RunWorker(const WorkerTask& task, const Settings& settings) {
     } catch (const std::exception& trouble) {
         Log(LOG_ERR, std::string("the worker ends: ") + trouble.what());
     }
-    taskInChildren = {-1, -1, -1, {}, nullptr};
+    taskInChildren = {-1, -1, nullptr};
     return 0;
 }

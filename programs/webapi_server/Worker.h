@@ -5,10 +5,8 @@
 #include "programs/webapi_server/Slot.h"
 
 struct WorkerTask {
-    int control;           // to the master
-    int listener;          // nonblocking
-    int taken;             // for reports of what was accepted there
-    TakenReport identity;  // for these
+    int control;   // to the master
+    int listener;  // nonblocking
     Slot* slot;
 };
 

@@ -43,12 +43,12 @@ void Workers::OnProcess(const Event& event, long long now) {
 }
 
 void Workers::Tick(long long now) {
-    ReadTaken(now);
     for (int index = 0; index < pool_.Size(); ++index) {
         PooledWorker& worker = pool_.At(index);
         const long long inState = now - worker.since;
         switch (worker.state) {
             case WorkerState::kBusy:
+                FollowOne(index, now);
                 if (worker.isTimedOut ||
                     IsPastDeadline(*slots_.At(index), worker.pid, &worker.watch, now)) {
                     EndInTime(index);
@@ -108,8 +108,10 @@ void Workers::EndAllInTime() {
 }
 
 void Workers::End(int index, long long now) {
-    ReadTaken(now);
     PooledWorker& worker = pool_.At(index);
+    if (worker.state == WorkerState::kBusy) {
+        FollowOne(index, now);
+    }
     if (worker.connection >= 0) {
         SettleConnection(index, now);
     }

@@ -2,6 +2,7 @@
 
 #include <errno.h>
 #include <sys/socket.h>
+#include <sys/syscall.h>
 #include <sys/sysinfo.h>
 #include <syslog.h>
 #include <unistd.h>
@@ -16,12 +17,38 @@ constexpr long long kFirstPause = 100;
 constexpr int kMostDoublings = 6;
 constexpr int kAtOncePerProcessor = 2;
 
+// Most requests are over by then.
+constexpr long long kFetchAfter = 2;
+
+// A duplicate of another process's; -1 where the system refuses that.
+int DescriptorOf(int process, int number) {
+    return static_cast<int>(syscall(SYS_pidfd_getfd, process, number, 0));
+}
+
+bool IsSocket(int descriptor) {
+    int type = 0;
+    socklen_t size = sizeof type;
+    return getsockopt(descriptor, SOL_SOCKET, SO_TYPE, &type, &size) == 0;
+}
+
+// Of whom the worker took by itself and still has; -1 when that has changed meanwhile.
+int FetchConnection(int process, const Slot& slot) {
+    const unsigned takes = slot.takes;
+    const int number = slot.connection;
+    const int connection = number > 0 ? DescriptorOf(process, number) : -1;
+    const bool isSame = slot.takes == takes && slot.connection == number;
+    if (connection >= 0 && !(isSame && IsSocket(connection))) {
+        (void)close(connection);
+        return -1;
+    }
+    return connection;
+}
+
 }  // namespace
 
-Workers::Workers(const Poller& poller, const TakenChannel& taken, SlotTable& slots,
-                 const Settings& settings, ConnectionQueue& queue, Farewell& farewell)
+Workers::Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
+                 ConnectionQueue& queue, Farewell& farewell)
     : poller_(poller),
-      taken_(taken),
       slots_(slots),
       settings_(settings),
       queue_(queue),
@@ -52,6 +79,7 @@ bool Workers::HandOverAtOnce(const Waiting& waiting, long long now) {
                         MSG_DONTWAIT)) {
             worker.connection = waiting.connection;
             worker.returns = waiting.returns;
+            worker.takes = 0;
             BeginWatch(worker, now);
             pool_.SetState(index, WorkerState::kBusy, now);
             return true;
@@ -78,8 +106,8 @@ bool Workers::MayBegin(long long now) {
 }
 
 void Workers::LetTake(bool may) {
-    if (may != mayTake_) {
-        mayTake_ = may;
+    if ((may && canFetch_) != mayTake_) {
+        mayTake_ = may && canFetch_;
         ShowMayTake();
     }
 }
@@ -97,21 +125,40 @@ void Workers::ShowMayTake() {
     }
 }
 
-// With the next connection a worker says that it is done with the one before.
-void Workers::ReadTaken(long long now) {
-    TakenReport report = {};
-    int connection = -1;
-    while (taken_.Read(&report, &connection)) {
-        const int index = pool_.Find(report.slot, report.serial);
-        if (index < 0 || pool_.At(index).state != WorkerState::kBusy) {
-            (void)close(connection);
-            continue;
+void Workers::Follow(long long now) {
+    if (!mayTake_ && !isBehind_) {
+        return;
+    }
+    isBehind_ = false;
+    for (int index = 0; index < pool_.Size(); ++index) {
+        if (pool_.At(index).state == WorkerState::kBusy) {
+            FollowOne(index, now);
+            isBehind_ = isBehind_ || pool_.At(index).connection < 0;
         }
-        PooledWorker& worker = pool_.At(index);
-        farewell_.Close(worker.connection, now);
-        worker.connection = connection;
+    }
+}
+
+// One that has taken another connection is done with the one before.
+void Workers::FollowOne(int index, long long now) {
+    PooledWorker& worker = pool_.At(index);
+    const Slot& slot = *slots_.At(index);
+    const unsigned takes = slot.takes;
+    if (takes != worker.takes) {
+        LetGoOfConnection(worker, now);
+        worker.takes = takes;
         worker.returns = 0;
         BeginWatch(worker, now);
+    }
+    if (worker.connection < 0 && now - slot.takenAt >= kFetchAfter) {
+        worker.connection = FetchConnection(worker.process, slot);
+    }
+}
+
+// Of a request that could not be read, the rest may still be there.
+void Workers::LetGoOfConnection(PooledWorker& worker, long long now) {
+    if (worker.connection >= 0) {
+        farewell_.Close(worker.connection, now);
+        worker.connection = -1;
     }
 }
 
@@ -176,12 +223,9 @@ void Workers::OnControl(const Event& event, long long now) {
 }
 
 void Workers::BecomeIdle(int index, long long now) {
-    ReadTaken(now);
     PooledWorker& worker = pool_.At(index);
     if (worker.state == WorkerState::kBusy) {
-        // Of a request that could not be read, the rest may still be there.
-        farewell_.Close(worker.connection, now);
-        worker.connection = -1;
+        LetGoOfConnection(worker, now);
     } else if (worker.state != WorkerState::kStarting) {
         return;
     }
@@ -248,10 +292,20 @@ void Workers::OnStarted(const TemplateReport& report, int process) {
         pool_.At(index).pid = report.pid;
         pool_.At(index).process = process;
         if (process >= 0) {
+            SeeWhetherToFetch(process);
             (void)poller_.Add(process, {Source::kProcess, index, report.serial});
         }
     } else if (process >= 0) {
         (void)close(process);
+    }
+}
+
+// All workers are alike, and each has a standard input.
+void Workers::SeeWhetherToFetch(int process) {
+    const int descriptor = canFetch_ ? -1 : DescriptorOf(process, STDIN_FILENO);
+    if (descriptor >= 0) {
+        (void)close(descriptor);
+        canFetch_ = true;
     }
 }
 

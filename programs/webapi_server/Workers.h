@@ -7,17 +7,18 @@
 #include "programs/webapi_server/Pool.h"
 #include "programs/webapi_server/Queue.h"
 #include "programs/webapi_server/SlotTable.h"
-#include "programs/webapi_server/TakenChannel.h"
 #include "programs/webapi_server/Templates.h"
 
 // The master's side of the workers: starts them, hands requests over, sees to it that
 // each request is answered whatever becomes of its worker. The master has a duplicate
-// of every connection until its worker is done with it, also of those that workers take
-// by themselves.
+// of every connection that it hands over until the worker is done with it. Of one that
+// a worker has taken by itself it gets a duplicate out of the worker's process, unless
+// that is done first, as with nearly all: for some milliseconds only the worker has it,
+// and the web server answers for one that is killed just then.
 class Workers : public TemplateEvents {
   public:
-    Workers(const Poller& poller, const TakenChannel& taken, SlotTable& slots,
-            const Settings& settings, ConnectionQueue& queue, Farewell& farewell);
+    Workers(const Poller& poller, SlotTable& slots, const Settings& settings,
+            ConnectionQueue& queue, Farewell& farewell);
     ~Workers() override;
     Workers(const Workers&) = delete;
     Workers& operator=(const Workers&) = delete;
@@ -39,11 +40,17 @@ class Workers : public TemplateEvents {
     // Whether one more request may begin now.
     bool MayBegin(long long now);
 
-    // Whether workers that are done may take who connects by themselves.
+    // Whether workers that are done may take who connects by themselves. They never may
+    // where the system does not let the master have their connections.
     void LetTake(bool may);
 
-    // Sees which connections they have taken.
-    void ReadTaken(long long now);
+    // Sees what they have taken.
+    void Follow(long long now);
+
+    // Whether one has a connection that the master does not have yet.
+    bool IsBehind() const {
+        return isBehind_;
+    }
 
     // Starts what is wanted while so many requests wait.
     void Grow(long long now);
@@ -80,6 +87,9 @@ class Workers : public TemplateEvents {
     bool Start(int generation, long long now);
     bool MayTake(const PooledWorker& worker) const;
     void ShowMayTake();
+    void SeeWhetherToFetch(int process);
+    void FollowOne(int index, long long now);
+    void LetGoOfConnection(PooledWorker& worker, long long now);
     void BeginWatch(PooledWorker& worker, long long now) const;
     void BecomeIdle(int index, long long now);
     void Dismiss(int index, long long now);
@@ -95,7 +105,6 @@ class Workers : public TemplateEvents {
     std::string ApiOf(int index) const;
 
     const Poller& poller_;
-    const TakenChannel& taken_;
     SlotTable& slots_;
     const Settings& settings_;
     ConnectionQueue& queue_;
@@ -103,6 +112,8 @@ class Workers : public TemplateEvents {
     Templates* templates_ = nullptr;
     Pool pool_;
     bool mayTake_ = false;
+    bool isBehind_ = false;
+    bool canFetch_ = false;
     long long startNotBefore_ = 0;
     int startFailures_ = 0;  // in a row
 };

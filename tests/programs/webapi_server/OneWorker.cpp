@@ -66,7 +66,7 @@ int main(int argc, char** argv) {
     if (worker == 0) {
         (void)close(listener);
         (void)close(control[0]);
-        _exit(RunWorker({control[1], -1, -1, {}, slot}, settings));
+        _exit(RunWorker({control[1], -1, slot}, settings));
     }
     (void)close(control[1]);
     (void)std::printf("%d\n", static_cast<int>(worker));

@@ -67,7 +67,9 @@ void Crash(APIRequest*, APIResponse*) {
     (void)raise(SIGSEGV);
 }
 
-void Vanish(APIRequest*, APIResponse*) {
+void Vanish(APIRequest* request, APIResponse*) {
+    const Json::Value milliseconds = request->GetParam("milliseconds", Json::Value(0));
+    (void)usleep(static_cast<useconds_t>(milliseconds.asInt()) * 1000);
     (void)raise(SIGKILL);
 }
 

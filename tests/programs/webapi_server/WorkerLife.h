@@ -24,7 +24,7 @@ constexpr int kPatience = 20000;  // milliseconds
 
 inline const char kLives[] = R"({"Test.Lives": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
     "authLevel": 0, "isolation": "worker", "deadline": 7, "methods": {"1": ["echo", "variable",
-    "leave", "child", "crash", "input", {"raw": {"allowDownload": true}}]}}})";
+    "leave", "child", "wait", "crash", "input", {"raw": {"allowDownload": true}}]}}})";
 inline const char kEnds[] = R"({"Test.Ends": {"lib": "MODULE", "minVersion": 1, "maxVersion": 1,
     "authLevel": 0, "methods": {"1": ["echo"]}}})";
 inline const char kCompound[] =
@@ -62,7 +62,7 @@ class WorkerLife : public testing::Test {
         slot_ = new (memory) Slot();
     }
     ~WorkerLife() override {
-        for (const int descriptor : {control_, listener_, taken_[0], taken_[1]}) {
+        for (const int descriptor : {control_, listener_}) {
             if (descriptor >= 0) {
                 (void)close(descriptor);
             }
@@ -83,7 +83,7 @@ class WorkerLife : public testing::Test {
             (void)setrlimit(RLIMIT_CORE, &none);
             (void)close(ends[0]);
             (void)!chdir(folder_.Path("").c_str());
-            _exit(RunWorker({ends[1], listener_, taken_[1], {7, 70}, slot_}, settings_));
+            _exit(RunWorker({ends[1], listener_, slot_}, settings_));
         }
         (void)close(ends[1]);
         control_ = ends[0];
@@ -151,7 +151,6 @@ class WorkerLife : public testing::Test {
     pid_t worker_ = -1;
     int control_ = -1;
     int listener_ = -1;
-    int taken_[2] = {-1, -1};
 };
 
 inline Json::Value Body(const std::string& reply) {

@@ -84,6 +84,12 @@ void Child(APIRequest*, APIResponse* response) {
     response->SetSuccess(static_cast<int>(child));
 }
 
+void Wait(APIRequest*, APIResponse*) {
+    for (;;) {
+        (void)pause();
+    }
+}
+
 void Crash(APIRequest*, APIResponse*) {
     (void)signal(SIGUSR1, SIG_DFL);
     abort();
@@ -107,9 +113,9 @@ void Raw(APIRequest*, APIResponse* response) {
 TALO::_tag_API_TABLE table[] = {
     {"Test.Lives", 1, "echo", Echo},   {"Test.Lives", 1, "variable", Variable},
     {"Test.Lives", 1, "leave", Leave}, {"Test.Lives", 1, "child", Child},
-    {"Test.Lives", 1, "crash", Crash}, {"Test.Lives", 1, "raw", Raw},
-    {"Test.Lives", 1, "input", Input}, {"Test.Ends", 1, "echo", Echo},
-    {nullptr, 0, nullptr, nullptr},
+    {"Test.Lives", 1, "wait", Wait},   {"Test.Lives", 1, "crash", Crash},
+    {"Test.Lives", 1, "raw", Raw},     {"Test.Lives", 1, "input", Input},
+    {"Test.Ends", 1, "echo", Echo},    {nullptr, 0, nullptr, nullptr},
 };
 
 }  // namespace

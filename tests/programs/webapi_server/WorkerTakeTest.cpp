@@ -4,10 +4,12 @@
 #include <poll.h>
 #include <signal.h>
 #include <sys/socket.h>
+#include <sys/syscall.h>
 #include <sys/un.h>
 #include <unistd.h>
 
 #include <string>
+#include <thread>
 
 #include "programs/webapi_server/Message.h"
 #include "tests/programs/webapi_server/Netstring.h"
@@ -28,20 +30,29 @@ class WorkerTake : public support::WorkerLife {
         ASSERT_EQ(
             0, bind(listener_, reinterpret_cast<const struct sockaddr*>(&address), sizeof address));
         ASSERT_EQ(0, listen(listener_, 8));
-        ASSERT_EQ(0, socketpair(AF_UNIX, SOCK_SEQPACKET | SOCK_CLOEXEC, 0, taken_));
     }
 
-    // A client there, which has sent a call already.
-    int ConnectToListener(const std::string& method) const {
+    // A client there.
+    int ConnectToListener() const {
         const int client = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
         const struct sockaddr_un address = Address();
         EXPECT_EQ(
             0, connect(client, reinterpret_cast<const struct sockaddr*>(&address), sizeof address));
-        const std::string bytes =
-            support::HeaderBlock({{"CONTENT_LENGTH", "0"},
-                                  {"SCGI", "1"},
-                                  {"QUERY_STRING", "api=Test.Lives&version=1&method=" + method}});
+        return client;
+    }
+    static void Send(int client, const std::string& bytes) {
         EXPECT_EQ(static_cast<ssize_t>(bytes.size()), write(client, bytes.data(), bytes.size()));
+    }
+    static std::string BlockOf(const std::string& method) {
+        return support::HeaderBlock(
+            {{"CONTENT_LENGTH", "0"},
+             {"SCGI", "1"},
+             {"QUERY_STRING", "api=Test.Lives&version=1&method=" + method}});
+    }
+    // One which has sent a call already.
+    int Ask(const std::string& method) const {
+        const int client = ConnectToListener();
+        Send(client, BlockOf(method));
         return client;
     }
     bool HasClients() const {
@@ -49,14 +60,33 @@ class WorkerTake : public support::WorkerLife {
         return poll(&input, 1, 0) == 1;
     }
 
-    // The master's duplicate of a connection that the worker has taken; -1 when it has
-    // told of none.
-    int Taken() const {
-        TakenReport report = {};
-        int connection = -1;
-        const ssize_t got =
-            ReceiveMessage(taken_[0], &report, sizeof report, &connection, MSG_DONTWAIT);
-        EXPECT_TRUE(got != sizeof report || (report.slot == 7 && report.serial == 70));
+    // Whether the slot comes to show such a descriptor.
+    bool Shows(bool (*isSuch)(int number)) const {
+        for (int waited = 0; waited < support::kPatience; ++waited) {
+            if (isSuch(slot_->connection)) {
+                return true;
+            }
+            (void)usleep(1000);
+        }
+        return false;
+    }
+
+    void OutlivesTheWorker(int connection, int client) {
+        ASSERT_GE(connection, 0);
+        EXPECT_EQ(0, kill(worker_, SIGKILL));
+        EXPECT_EQ(1000 + SIGKILL, Ended());
+        EXPECT_EQ(5, write(connection, "still", 5));
+        (void)close(connection);
+        EXPECT_EQ("still", ReadAll(client));
+        (void)close(client);
+    }
+
+    // A duplicate of the connection that the worker shows, as the master gets it.
+    int Fetched() const {
+        const int process = static_cast<int>(syscall(SYS_pidfd_open, worker_, 0));
+        const int number = slot_->connection;
+        const int connection = static_cast<int>(syscall(SYS_pidfd_getfd, process, number, 0));
+        (void)close(process);
         return connection;
     }
 
@@ -72,38 +102,67 @@ class WorkerTake : public support::WorkerLife {
 
 }  // namespace
 
-TEST_F(WorkerTake, TakesWhoHasConnectedSinceAndTellsTheMaster) {
+TEST_F(WorkerTake, TakesWhoHasConnectedSinceAndCountsThem) {
     Listen();
     Start();
     slot_->mayTake = 1;
-    const int first = ConnectToListener("echo&text=first");
-    const int second = ConnectToListener("echo&text=second");
+    const int first = Ask("echo&text=first");
+    const int second = Ask("echo&text=second");
     EXPECT_EQ("led", Body(Call("echo", "text=led"))["data"]["text"].asString());
     EXPECT_EQ("first", Body(ReadAll(first))["data"]["text"].asString());
     EXPECT_EQ("second", Body(ReadAll(second))["data"]["text"].asString());
     EXPECT_FALSE(HasClients());
     ASSERT_TRUE(SaysIdle());
     EXPECT_GT(slot_->takenAt, 0);
-    for (const int client : {first, second}) {
-        const int connection = Taken();
-        EXPECT_GE(connection, 0);
-        (void)close(connection);
-        (void)close(client);
-    }
-    EXPECT_EQ(-1, Taken());
+    EXPECT_EQ(2U, slot_->takes);
+    EXPECT_EQ(0, slot_->connection) << "it has none any more";
+    (void)close(first);
+    (void)close(second);
 }
 
-// Whoever ends it meanwhile must not take it for answered.
-TEST_F(WorkerTake, TellsOfWhoItTookBeforeItServes) {
+TEST_F(WorkerTake, ShowsTheConnectionThatItTook) {
     Listen();
     Start();
     slot_->mayTake = 1;
-    const int client = ConnectToListener("crash");
+    const int client = ConnectToListener();
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    Send(client, BlockOf("wait").substr(0, 9));
+    ASSERT_TRUE(Shows([](int number) { return number > STDERR_FILENO; }));
+    OutlivesTheWorker(Fetched(), client);
+}
+
+TEST_F(WorkerTake, ShowsTheConnectionWhereItLiesWhileAMethodRuns) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int client = Ask("wait");
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    ASSERT_TRUE(Shows([](int number) { return number == STDOUT_FILENO; }));
+    OutlivesTheWorker(Fetched(), client);
+}
+
+TEST_F(WorkerTake, AnswersWhoSendsNoRequestAndTakesTheRestOfIt) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int client = ConnectToListener();
+    EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+    const std::string bytes = "GET / HTTP/1.0\r\n" + std::string(1 << 20, 'x');
+    std::thread sender([&] { Send(client, bytes); });
+    EXPECT_NE(std::string::npos, ReadAll(client).find("Status: 400"));
+    sender.join();
+    (void)close(client);
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_EQ(0, slot_->connection);
+}
+
+TEST_F(WorkerTake, AnswersACrashOfWhatItTookByItself) {
+    Listen();
+    Start();
+    slot_->mayTake = 1;
+    const int client = Ask("crash");
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     EXPECT_LT(1000, Ended());
-    const int connection = Taken();
-    EXPECT_GE(connection, 0);
-    (void)close(connection);
     EXPECT_EQ(117, Body(ReadAll(client))["error"]["code"].asInt());
     (void)close(client);
 }
@@ -111,11 +170,10 @@ TEST_F(WorkerTake, TellsOfWhoItTookBeforeItServes) {
 TEST_F(WorkerTake, LeavesClientsToTheMasterUnlessItMayTakeThem) {
     Listen();
     Start();
-    const int client = ConnectToListener("echo");
+    const int client = Ask("echo");
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     ASSERT_TRUE(SaysIdle());
     EXPECT_TRUE(HasClients());
-    EXPECT_EQ(-1, Taken());
     (void)close(client);
 }
 
@@ -123,7 +181,7 @@ TEST_F(WorkerTake, TakesNobodyWhenItsRequestWasItsLast) {
     Listen();
     Start();
     slot_->mayTake = 1;
-    const int client = ConnectToListener("echo");
+    const int client = Ask("echo");
     EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo"))["success"].asBool());
     EXPECT_EQ(0, Ended());
     EXPECT_TRUE(HasClients());

@@ -16,9 +16,6 @@ import unittest
 import scgi_server
 from scgi_server import LIVING, LONG, ONCE, PATIENT, SERVER, Reply, query_request, wait_for
 
-SOAK_CLIENT = os.environ["SOAK_CLIENT"]
-SANITIZED = os.environ["WEBAPI_SANITIZED"] == "1"
-
 
 class Answers(scgi_server.ServerTest):
     def test_answers_a_request(self):
@@ -154,37 +151,6 @@ class Workers(scgi_server.ServerTest):
         self.echo()
         self.assertLessEqual(len(self.processes()), 8)
 
-    def test_wakes_the_master_for_few_requests_under_load(self):
-        """But where the machine is so slow that requests do not count as new ones."""
-        if SANITIZED:
-            self.skipTest("a request of a sanitized worker takes too long to count as a new one")
-        server = self.start()
-        self.echo()
-        requests = 4000
-        command = [SOAK_CLIENT, self.socket, str(requests), str(min(8 * os.cpu_count(), 64)), "0"]
-
-        def waits():
-            with open(f"/proc/{server.pid}/status", encoding="ascii") as file:
-                return sum(int(line.split()[1]) for line in file if line.startswith("voluntary"))
-
-        found = []
-        while (not found or min(found) >= requests / 2) and len(found) < 10:
-            before = waits()
-            subprocess.run(command, check=True, timeout=LONG)
-            found.append(waits() - before)
-        # One for each at least, where it hands over every one.
-        self.assertLess(min(found), requests / 2)
-
-    def test_lets_go_of_clients_that_workers_took(self):
-        server = self.start("--max-workers", "4")
-        self.echo()
-        sockets = f"/proc/{server.pid}/fd"
-        command = [SOAK_CLIENT, self.socket, "5000", "16", "0"]
-        subprocess.run(command, check=True, timeout=LONG)
-        # Signals, events, listener, reports, template, and two for each worker.
-        self.assertTrue(wait_for(lambda: len(os.listdir(sockets)) <= 3 + 7 + 2 * 4),
-                        os.listdir(sockets))
-
     def test_replaces_a_worker_that_died_while_idle(self):
         server = self.start("--min-workers", "6")
         self.echo()
@@ -229,7 +195,7 @@ class Workers(scgi_server.ServerTest):
         # The template has none of a request; what it has is of all of them.
         (template,) = self.children(server.pid)
         common = {target for target, users in seen.items() if template in users}
-        self.assertEqual(len(common), 3, common)
+        self.assertEqual(len(common), 2, common)
         shared = {target: users for target, users in seen.items()
                   if len(users) > 1 and target not in common}
         self.assertEqual(sum(target not in common for target in seen), 3 + 3 + 1)
@@ -260,7 +226,7 @@ class Workers(scgi_server.ServerTest):
         before = looks[-1]
         for _ in range(100):
             self.echo()
-        self.ask(LIVING, "vanish")
+        self.ask(LIVING, "vanish", milliseconds=50)
         self.echo()
         self.assertTrue(wait_for(lambda: sorted(descriptors()) == before), before)
 
