@@ -1,4 +1,5 @@
 #include <cstdlib>
+#include <utility>
 
 #include "Catalog.h"
 #include "webapi/APIRequest.h"
@@ -14,9 +15,14 @@ namespace {
 // Reads each description once, for the methods' attributes too.
 class Descriptions : public APIRunner {
   public:
-    const Json::Value& ReadAll() {
-        (void)InitLibDesc(libDesc);
-        return libDesc;
+    // One at a time: all of them at once would fill the processor's caches.
+    template <typename Visit>
+    void VisitAll(Visit visit) {
+        (void)VisitLibDesc([&](const std::string& name, Json::Value& description) {
+            libDesc.clear();
+            libDesc[name].swap(description);
+            visit(name, libDesc[name]);
+        });
     }
 
     // Null when there is none of that name.
@@ -88,13 +94,18 @@ Json::Value Entry(APIRunner& runner, const std::string& name, const Json::Value&
 
 void List(APIRequest* request, APIResponse* response) {
     Descriptions known;
-    const Json::Value& all = known.ReadAll();
+    Json::Value entries(Json::objectValue);
+    known.VisitAll([&](const std::string& name, const Json::Value& description) {
+        // One that another file described before is replaced.
+        entries.removeMember(name);
+        if (MayCall(*request, description)) {
+            entries[name] = Entry(known, name, description);
+        }
+    });
     Json::Value data(Json::objectValue);
     Json::Value& apis = data["apis"] = Json::Value(Json::arrayValue);
-    for (auto description = all.begin(); description != all.end(); ++description) {
-        if (MayCall(*request, *description)) {
-            apis.append(Entry(known, description.name(), *description));
-        }
+    for (Json::Value& entry : entries) {
+        apis.append(std::move(entry));
     }
     response->TakeSuccess(&data);
 }

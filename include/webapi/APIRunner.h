@@ -3,6 +3,7 @@
 
 #include <json/json.h>
 
+#include <functional>
 #include <map>
 #include <string>
 
@@ -94,6 +95,14 @@ class WEBAPI_EXPORT APIRunner {
     int InitLibDesc(Json::Value& descs, const std::string& api);
     int InitLibDesc(Json::Value& descs, APIRequest* request);
     int InitLibDesc(Json::Value& descs);
+
+    /// For who needs one description after the other and not all at once: calls
+    /// `visit` with the name and the description of each API of every "*.lib" of the
+    /// working directory. The description is the visitor's to change or to swap away.
+    /// Of an API that two files describe, the last one counts elsewhere.
+    typedef std::function<void(const std::string& api, Json::Value& desc)> DescVisitor;
+    int VisitLibDesc(const DescVisitor& visit);
+
     int CheckLibDescription(Json::Value& desc);
     Json::Value& ApplyLibDef(Json::Value& desc);
 

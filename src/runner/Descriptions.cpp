@@ -47,18 +47,44 @@ std::string FindDescriptionFile(const std::string& api) {
 
 // The file's content is the caller's own and goes: a copy of each description would
 // be the largest part of what a request costs in a process that keeps the files.
-void AddDescriptions(APIRunner& runner, Json::Value& file, Json::Value& descs) {
+void VisitDescriptions(APIRunner& runner, Json::Value& file, const APIRunner::DescVisitor& visit) {
     if (!file.isObject()) {
         return;
     }
     for (auto member = file.begin(); member != file.end(); ++member) {
         if (runner.CheckLibDescription(*member)) {
-            descs[member.name()].swap(runner.ApplyLibDef(*member));
+            visit(member.name(), runner.ApplyLibDef(*member));
         } else {
             LOG_ERROR("WebAPI description %s is not valid.", member.name().c_str());
         }
     }
 }
+
+APIRunner::DescVisitor Into(Json::Value* descs) {
+    return [descs](const std::string& api, Json::Value& desc) { (*descs)[api].swap(desc); };
+}
+
+// The names of all that there are, in the order of the alphabet.
+class DescriptionFiles {
+  public:
+    DescriptionFiles()
+        : files_(), count_(glob("*.lib", 0, nullptr, &files_) == 0 ? files_.gl_pathc : 0) {}
+    ~DescriptionFiles() {
+        globfree(&files_);
+    }
+    DescriptionFiles(const DescriptionFiles&) = delete;
+    DescriptionFiles& operator=(const DescriptionFiles&) = delete;
+    size_t Count() const {
+        return count_;
+    }
+    const char* Path(size_t index) const {
+        return files_.gl_pathv[index];
+    }
+
+  private:
+    glob_t files_;
+    const size_t count_;
+};
 
 }  // namespace
 
@@ -83,7 +109,7 @@ int APIRunner::InitLibDesc(Json::Value& descs, const std::string& api) {
         LOG_ERROR("WebAPI description file %s is not valid", file.c_str());
         return 0;
     }
-    AddDescriptions(*this, content, descs);
+    VisitDescriptions(*this, content, Into(&descs));
     return 1;
 }
 
@@ -91,21 +117,20 @@ int APIRunner::InitLibDesc(Json::Value& descs, APIRequest* request) {
     return request != nullptr ? InitLibDesc(descs, request->GetAPIClass()) : 0;
 }
 
-// Who asks for all of them will ask again, or is about to fork those who will.
 int APIRunner::InitLibDesc(Json::Value& descs) {
-    glob_t files = {};
-    if (glob("*.lib", 0, nullptr, &files) != 0) {
-        globfree(&files);
-        return 0;
-    }
-    for (size_t index = 0; index < files.gl_pathc; ++index) {
+    return VisitLibDesc(Into(&descs));
+}
+
+// Who asks for all of them will ask again, or is about to fork those who will.
+int APIRunner::VisitLibDesc(const DescVisitor& visit) {
+    const DescriptionFiles files;
+    for (size_t index = 0; index < files.Count(); ++index) {
         Json::Value content;
-        if (ReadDescriptionFile(content, files.gl_pathv[index], Keep::kAtOnce)) {
-            AddDescriptions(*this, content, descs);
+        if (ReadDescriptionFile(content, files.Path(index), Keep::kAtOnce)) {
+            VisitDescriptions(*this, content, visit);
         }
     }
-    globfree(&files);
-    return 1;
+    return files.Count() > 0 ? 1 : 0;
 }
 
 // An empty "lib" passes: it fails when the library is opened.

@@ -115,6 +115,21 @@ class Catalog(ApplianceTest):
         self.assertNotIn("summary", entry)
         self.assertNotIn("doc", entry["versions"]["2"]["c"])
 
+    def test_lists_by_name_and_once_what_several_files_describe(self):
+        """The file whose name comes last counts."""
+        closed = {**DESCRIPTION, "authLevel": 1, "allowUser": []}
+        for first, last, is_listed in ((closed, DESCRIPTION, True), (DESCRIPTION, closed, False)):
+            for name, description in (("Test.Twice", first), ("Test.Zwice", last)):
+                path = appliance.WEBAPI_DIR / f"{name}.lib"
+                self.addCleanup(path.unlink, missing_ok=True)
+                path.write_text(json.dumps({"Test.Twice": description,
+                                            "Another." + name: DESCRIPTION}), encoding="utf-8")
+            names = [entry["name"] for entry in
+                     catalog("list", self.log_in("normal")).data["apis"]]
+            self.assertEqual(names, sorted(names))
+            self.assertEqual(names.count("Test.Twice"), int(is_listed))
+            self.assertIn("Another.Test.Twice", names)
+
     def test_survives_documentation_that_is_none(self):
         for number, doc in enumerate(("text", 1, [], None, {"summary": 1, "methods": []},
                                       {"methods": {"run": "text"}}, {"methods": None})):

@@ -2,6 +2,7 @@
 #include <unistd.h>
 
 #include <fstream>
+#include <stdexcept>
 
 #include "tests/fake/FakePlatform.h"
 #include "tests/runner/RunnerFixture.h"
@@ -269,6 +270,53 @@ TEST_F(AllDescriptionFiles, SkipInvalidMembersAndFillDefaults) {
         EXPECT_EQ(descs.getMemberNames(), std::vector<std::string>({"Good"}));
         EXPECT_EQ(descs["Good"]["requestFormat"], Json::Value("JSON"));
         EXPECT_TRUE(Logged("WebAPI description Bad is not valid."));
+    });
+}
+
+TEST_F(AllDescriptionFiles, AreVisitedOneAfterTheOther) {
+    Touch("A.lib");
+    Touch("B.lib");
+    Json::Value content(Json::objectValue);
+    content["Bad"] = 1;
+    content["First"] = Description();
+    content["Twice"] = Description();
+    Describe("A.lib", content);
+    Write("B.lib", "Twice");
+    runner::InChild([&] {
+        ASSERT_EQ(chdir(folder), 0);
+        std::vector<std::string> names;
+        const auto visit = [&](const std::string& name, Json::Value& description) {
+            EXPECT_EQ(description["requestFormat"], Json::Value("JSON"));
+            Json::Value taken;
+            taken.swap(description);
+            names.push_back(name);
+        };
+        for (int round = 0; round < 2; ++round) {
+            names.clear();
+            EXPECT_EQ(Runner().VisitLibDesc(visit), 1);
+            EXPECT_EQ(names, std::vector<std::string>({"First", "Twice", "Twice"}));
+        }
+    });
+}
+
+TEST_F(AllDescriptionFiles, AreNotVisitedWhereThereAreNone) {
+    runner::InChild([&] {
+        ASSERT_EQ(chdir(folder), 0);
+        EXPECT_EQ(Runner().VisitLibDesc(
+                      [](const std::string& name, Json::Value&) { ADD_FAILURE() << name; }),
+                  0);
+    });
+}
+
+TEST_F(AllDescriptionFiles, LetAVisitorThrow) {
+    Touch("A.lib");
+    Write("A.lib", "A");
+    runner::InChild([&] {
+        ASSERT_EQ(chdir(folder), 0);
+        EXPECT_THROW((void)Runner().VisitLibDesc([](const std::string&, Json::Value&) {
+            throw std::runtime_error("enough");
+        }),
+                     std::runtime_error);
     });
 }
 
