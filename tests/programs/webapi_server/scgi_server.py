@@ -120,10 +120,14 @@ class ServerTest(unittest.TestCase):
     def forget(cls, api):
         os.unlink(os.path.join(WEBAPI_DIR, api + ".lib"))
 
+    # Variables of the server's own.
+    environment = {}
+
     def start(self, *options, socket_path=None):
         self.socket = socket_path or os.path.join(self.folder, self._testMethodName)
         command = [SERVER, "--socket", self.socket, *options]
-        self.server = subprocess.Popen(command, stdin=subprocess.DEVNULL)
+        self.server = subprocess.Popen(command, stdin=subprocess.DEVNULL,
+                                       env={**os.environ, **self.environment})
         self.addCleanup(self.stop, self.server, self.socket)
         self.assertTrue(wait_for(self.listens))
         return self.server
@@ -175,6 +179,10 @@ class ServerTest(unittest.TestCase):
                 if os.readlink(f"/proc/{process}/fd/1").startswith("socket:"):
                     found.append(process)
         return found
+
+    def rest(self):
+        """Waits until the workers have put themselves back, behind their replies."""
+        self.assertTrue(wait_for(lambda: not self.busy()), self.busy())
 
     def occupy(self, count=1):
         """Connections, each with a worker that hangs until it is killed."""
