@@ -224,6 +224,8 @@ class Uploads(RelayCase):
         for piece in body[:5]:
             sender.send(piece)
         self.assertTrue(wait_until(self.second.entries))
+        # One that begins later would meet the next case.
+        self.assertTrue(wait_until(self.second.sessions))
         sender.close()
         for appliance in (self.first, self.second):
             self.assertTrue(wait_until(lambda: not appliance.entries()), "an entry still runs")
