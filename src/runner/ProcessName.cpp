@@ -22,6 +22,11 @@ namespace {
 char logIdentity[1024];
 char taskName[17];
 
+// As the system shows it.
+std::string UpToZero(const std::string& text) {
+    return text.substr(0, text.find('\0'));
+}
+
 // API and method are the client's text: a line break in one must not begin a
 // line of its own in the log.
 std::string WithoutControls(std::string text) {
@@ -51,11 +56,10 @@ int APIRunner::SetProcessName(APIRequest* request, APIResponse* response) {
         response->SetError(kErrorBadRequest, Json::Value());
         return 0;
     }
-    // Each ends at a zero byte that it may have.
     const std::string call =
-        WithoutControls(std::string(api.c_str()) + "[" + std::to_string(request->GetAPIVersion()) +
-                        "]." + request->GetAPIMethod().c_str());
-    Write(WithoutControls(d->GetProcName().c_str()) + "_" + call, logIdentity);
+        WithoutControls(UpToZero(api) + "[" + std::to_string(request->GetAPIVersion()) + "]." +
+                        UpToZero(request->GetAPIMethod()));
+    Write(WithoutControls(UpToZero(d->GetProcName())) + "_" + call, logIdentity);
     IdentifyToLog();
     d->SetArgv0(logIdentity);
     Write(call, taskName);
