@@ -32,6 +32,12 @@ class WorkerTake : public support::WorkerLife {
         ASSERT_EQ(0, listen(listener_, 8));
     }
 
+    void StartTaking() {
+        Listen();
+        Start();
+        slot_->mayTake = 1;
+    }
+
     // A client there.
     int ConnectToListener() const {
         const int client = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
@@ -103,9 +109,7 @@ class WorkerTake : public support::WorkerLife {
 }  // namespace
 
 TEST_F(WorkerTake, TakesWhoHasConnectedSinceAndCountsThem) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int first = Ask("echo&text=first");
     const int second = Ask("echo&text=second");
     EXPECT_EQ("led", Body(Call("echo", "text=led"))["data"]["text"].asString());
@@ -121,9 +125,7 @@ TEST_F(WorkerTake, TakesWhoHasConnectedSinceAndCountsThem) {
 }
 
 TEST_F(WorkerTake, ShowsTheConnectionThatItTook) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int client = ConnectToListener();
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     Send(client, BlockOf("wait").substr(0, 9));
@@ -132,9 +134,7 @@ TEST_F(WorkerTake, ShowsTheConnectionThatItTook) {
 }
 
 TEST_F(WorkerTake, ShowsTheConnectionWhereItLiesWhileAMethodRuns) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int client = Ask("wait");
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     ASSERT_TRUE(Shows([](int number) { return number == STDOUT_FILENO; }));
@@ -142,9 +142,7 @@ TEST_F(WorkerTake, ShowsTheConnectionWhereItLiesWhileAMethodRuns) {
 }
 
 TEST_F(WorkerTake, AnswersWhoSendsNoRequestAndTakesTheRestOfIt) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int client = ConnectToListener();
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     const std::string bytes = "GET / HTTP/1.0\r\n" + std::string(1 << 20, 'x');
@@ -157,9 +155,7 @@ TEST_F(WorkerTake, AnswersWhoSendsNoRequestAndTakesTheRestOfIt) {
 }
 
 TEST_F(WorkerTake, AnswersACrashOfWhatItTookByItself) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int client = Ask("crash");
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     EXPECT_LT(1000, Ended());
@@ -178,9 +174,7 @@ TEST_F(WorkerTake, LeavesClientsToTheMasterUnlessItMayTakeThem) {
 }
 
 TEST_F(WorkerTake, TakesNobodyWhenItsRequestWasItsLast) {
-    Listen();
-    Start();
-    slot_->mayTake = 1;
+    StartTaking();
     const int client = Ask("echo");
     EXPECT_TRUE(Body(Get("api=Test.Ends&version=1&method=echo"))["success"].asBool());
     EXPECT_EQ(0, Ended());

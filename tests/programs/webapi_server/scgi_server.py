@@ -72,6 +72,11 @@ def wait_for(condition, seconds=LONG):
         time.sleep(0.02)
 
 
+def parent(pid):
+    with open(f"/proc/{pid}/stat", encoding="ascii") as file:
+        return int(file.read().rpartition(")")[2].split()[1])
+
+
 def alive(pid):
     try:
         with open(f"/proc/{pid}/stat", encoding="ascii") as file:
@@ -120,14 +125,10 @@ class ServerTest(unittest.TestCase):
     def forget(cls, api):
         os.unlink(os.path.join(WEBAPI_DIR, api + ".lib"))
 
-    # Variables of the server's own.
-    environment = {}
-
     def start(self, *options, socket_path=None):
         self.socket = socket_path or os.path.join(self.folder, self._testMethodName)
         command = [SERVER, "--socket", self.socket, *options]
-        self.server = subprocess.Popen(command, stdin=subprocess.DEVNULL,
-                                       env={**os.environ, **self.environment})
+        self.server = subprocess.Popen(command, stdin=subprocess.DEVNULL)
         self.addCleanup(self.stop, self.server, self.socket)
         self.assertTrue(wait_for(self.listens))
         return self.server
@@ -163,12 +164,9 @@ class ServerTest(unittest.TestCase):
     def children(self, pid):
         found = []
         for process in self.processes():
-            try:
-                with open(f"/proc/{process}/stat", encoding="ascii") as file:
-                    if int(file.read().rpartition(")")[2].split()[1]) == pid:
-                        found.append(process)
-            except OSError:
-                pass
+            with contextlib.suppress(OSError):
+                if parent(process) == pid:
+                    found.append(process)
         return found
 
     def busy(self):
