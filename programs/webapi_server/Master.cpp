@@ -110,22 +110,24 @@ bool Master::Begin() {
 
 void Master::WatchClients(bool wanted) {
     if (wanted && !isWatching_) {
-        isWatching_ = poller_.Add(listener_.Get(), {Source::kListener, 0, 0});
+        isWatching_ = poller_.AddLastInLine(listener_.Get(), {Source::kListener, 0, 0});
     } else if (!wanted && isWatching_) {
         poller_.Remove(listener_.Get());
         isWatching_ = false;
     }
 }
 
-// While the processors have enough to do, who connects waits in the socket for the
-// next worker that is done, and nobody is woken. As soon as one finds nobody there,
-// or is not done for some time, the master looks at the socket again.
+// Who connects wakes one of the workers that wait for it, and the master only where
+// there is none: it stands last in line. While the processors have enough to do it does
+// not either, and the client waits in the socket for the next worker that is done.
 void Master::ShareClients() {
-    workers_.Follow(now_);
+    if (workers_.Follow(now_)) {
+        WatchClients(false);
+    }
     if (!isWatching_) {
         WatchClients(isAccepting_ && workers_.MayBegin(now_));
     }
-    workers_.LetTake(isAccepting_ && !isWatching_ && queue_.Size() == 0);
+    workers_.LetTake(isAccepting_ && queue_.Size() == 0, now_);
 }
 
 void Master::Handle(const Event& event) {
@@ -141,9 +143,11 @@ void Master::Handle(const Event& event) {
             break;
         case Source::kControl:
             workers_.OnControl(event, now_);
+            hasClients_ = isWatching_;
             break;
         case Source::kProcess:
             workers_.OnProcess(event, now_);
+            hasClients_ = isWatching_;
             break;
         case Source::kFarewell:
             farewell_.OnReadable(event);
@@ -243,7 +247,7 @@ void Master::StartDraining() {
     }
     isAccepting_ = false;
     WatchClients(false);
-    workers_.LetTake(false);
+    workers_.LetTake(false, now_);
     listener_.Close();
 }
 
@@ -279,7 +283,7 @@ void Master::Tick() {
 int Master::MillisecondsToWait() const {
     const bool isQuiet = !workers_.AreBusy() && queue_.Size() == 0 && farewell_.IsEmpty() &&
                          drainUntil_ == 0 && isAccepting_ && templates_.Generation() != 0;
-    if ((isAccepting_ && !isWatching_) || workers_.IsBehind() ||
+    if ((isAccepting_ && !isWatching_) || workers_.MayBeBehind() ||
         (queue_.Size() > 0 && workers_.HaveIdle())) {
         return kLookAgain;
     }

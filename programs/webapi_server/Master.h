@@ -11,9 +11,9 @@
 void HoldSignals(sigset_t* before);
 
 // The process that supervises: hands connections to workers or lets them wait, while
-// there is much to do leaves it to workers to take the next, and answers in place of a
-// worker that cannot. It reads no request and
-// loads no API library. One thread, which waits for nobody in particular.
+// requests follow each other leaves it to workers to take the next, and answers in place
+// of a worker that cannot. It reads no request and loads no API library. One thread,
+// which waits for nobody in particular.
 class Master {
   public:
     Master(Listener& listener, const Settings& settings, const OriginalProcess& original);
@@ -53,7 +53,7 @@ class Master {
     long long now_;
     long long nextTick_ = 0;
     bool isAccepting_ = false;
-    bool isWatching_ = false;  // for clients; otherwise workers take them
+    bool isWatching_ = false;  // for clients for whom no worker waits
     bool hasClients_ = false;  // to accept
     long long acceptNotBefore_ = 0;
     long long nextCount_ = 0;   // of those who wait in the socket

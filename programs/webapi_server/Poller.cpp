@@ -22,8 +22,16 @@ Poller::~Poller() {
 }
 
 bool Poller::Add(int descriptor, Event event) const {
+    return Add(descriptor, event, EPOLLIN);
+}
+
+bool Poller::AddLastInLine(int descriptor, Event event) const {
+    return Add(descriptor, event, EPOLLIN | EPOLLEXCLUSIVE);
+}
+
+bool Poller::Add(int descriptor, Event event, unsigned events) const {
     struct epoll_event wanted = {};
-    wanted.events = EPOLLIN;
+    wanted.events = events;
     wanted.data.u64 = static_cast<uint64_t>(event.source) << kSourceShift |
                       static_cast<uint64_t>(static_cast<unsigned>(event.index)) << kIndexShift |
                       event.serial;

@@ -28,6 +28,9 @@ class Poller {
 
     bool Add(int descriptor, Event event) const;
 
+    // Tells of it only while nobody waits who has added the same one like this before.
+    bool AddLastInLine(int descriptor, Event event) const;
+
     // Needed before a close: while another process holds it too, the descriptor
     // would go on to be watched.
     void Remove(int descriptor) const;
@@ -36,6 +39,8 @@ class Poller {
     int Wait(Event* events, int most, int milliseconds) const;
 
   private:
+    bool Add(int descriptor, Event event, unsigned events) const;
+
     int epoll_;
 };
 

@@ -70,14 +70,19 @@ int Pool::ChooseIdle() const {
     return chosen;
 }
 
+bool Pool::IsNew(int index, long long now) const {
+    return At(index).state == WorkerState::kBusy && now - At(index).since < kNew;
+}
+
 bool Pool::MayBegin(long long now) const {
     if (Count(WorkerState::kBusy) < atOnce_) {
         return true;
     }
-    const auto isNew = [now](const PooledWorker& worker) {
-        return worker.state == WorkerState::kBusy && now - worker.since < kNew;
-    };
-    return std::count_if(workers_.begin(), workers_.end(), isNew) < atOnce_;
+    int count = 0;
+    for (int index = 0; index < Size(); ++index) {
+        count += IsNew(index, now) ? 1 : 0;
+    }
+    return count < atOnce_;
 }
 
 int Pool::Find(int index, unsigned serial) const {

@@ -26,9 +26,11 @@ struct PooledWorker {
     pid_t pid = 0;
     int process = -1;  // its process descriptor
     int control = -1;
-    int connection = -1;  // of the request that it has, where the master has it too
-    unsigned takes = 0;   // as its slot told when that was looked at last
-    int returns = 0;      // of that, from workers before
+    int connection = -1;    // of the request that it has, where the master has it too
+    unsigned turns = 0;     // as its slot told when that was looked at last
+    bool isInLine = false;  // for clients, by itself
+    bool isCalled = false;  // from there
+    int returns = 0;        // of that, from workers before
     bool isTimedOut = false;
     bool isUnanswered = false;  // its last request
     bool wasIdle = false;
@@ -60,6 +62,9 @@ class Pool {
     int Reserve(int generation, long long now);
     void SetState(int index, WorkerState state, long long now);
     void Free(int index);
+
+    // Whether it began lately, as most do that are not done yet.
+    bool IsNew(int index, long long now) const;
 
     // A busy one has gone on with another request since then.
     void BeginAnother(int index, long long since);

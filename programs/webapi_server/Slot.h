@@ -17,14 +17,21 @@ struct Slot {
     volatile sig_atomic_t answerBegun;  // the first byte of the reply is about to leave
     char api[128];                      // zero-terminated, for the log
     std::atomic<int> mayTake;           // 1: when done, a worker may take who connects by itself
-    std::atomic<unsigned> takes;        // how often it has since the master handed over
-    std::atomic<long long> takenAt;     // the last time, CLOCK_MONOTONIC ms
+    std::atomic<unsigned> turns;        // how often, since the master handed over, it was done
+                                        // and went on by itself, or took a client
+    std::atomic<long long> takenAt;     // the last client, CLOCK_MONOTONIC ms
     std::atomic<int> connection;        // the descriptor of whom it took; 0 when done
+
+    // For clients, by itself.
+    bool IsWaiting() const {
+        return turns != 0 && connection == 0 && began == 0;
+    }
 };
 
 // The control socket (SOCK_SEQPACKET) between the two. The master sends kServe with
-// the connection as its ancillary descriptor, or kLeave; the worker sends kIdle when
-// it is ready for another request. A worker that ends just closes its side.
-enum ControlMessage : char { kServe = 's', kLeave = 'l', kIdle = 'i' };
+// the connection as its ancillary descriptor, kLeave, or kCome to one that waits for
+// clients by itself and may not any more; the worker sends kIdle when it is ready for
+// another request of the master's. A worker that ends just closes its side.
+enum ControlMessage : char { kServe = 's', kLeave = 'l', kCome = 'c', kIdle = 'i' };
 
 #endif

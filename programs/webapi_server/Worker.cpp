@@ -16,6 +16,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <exception>
+#include <iterator>
 #include <string>
 #include <utility>
 #include <vector>
@@ -25,6 +26,7 @@
 #include "programs/common/CrashReply.h"
 #include "programs/common/DiscardInput.h"
 #include "programs/common/ErrorReply.h"
+#include "programs/webapi_server/Arrivals.h"
 #include "programs/webapi_server/Clock.h"
 #include "programs/webapi_server/Environment.h"
 #include "programs/webapi_server/Message.h"
@@ -36,13 +38,13 @@ namespace {
 
 // A child of a method's must neither keep the master waiting for this worker's
 // end nor speak for it.
-WorkerTask taskInChildren = {-1, -1, nullptr};
+int notInChildren[] = {-1, -1, -1};
 
-void LeaveSocketsInChild() {
-    for (int* socket : {&taskInChildren.control, &taskInChildren.listener}) {
-        if (*socket >= 0) {
-            (void)close(*socket);
-            *socket = -1;
+void CloseInChild() {
+    for (int& descriptor : notInChildren) {
+        if (descriptor >= 0) {
+            (void)close(descriptor);
+            descriptor = -1;
         }
     }
 }
@@ -147,21 +149,33 @@ class Worker {
           settings_(settings),
           process_(getpid()),
           end_(MillisecondsNow() + settings.workerSeconds * 1000LL),
+          arrivals_(task.listener, task.control),
           state_(TALO_TASK_DIR) {
         mostMemory_ = state_.PrivateKiB() + settings.workerGrowthKiB;
+        notInChildren[0] = task.control;
+        notInChildren[1] = task.listener;
+        notInChildren[2] = arrivals_.Descriptor();
     }
+    ~Worker() {
+        std::fill(std::begin(notInChildren), std::end(notInChildren), -1);
+    }
+    Worker(const Worker&) = delete;
+    Worker& operator=(const Worker&) = delete;
 
     void Live() {
         int connection = -1;
-        while ((Take(&connection) || (SayIdle() && AwaitConnection(&connection))) &&
-               Serve(connection) && MayGoOn()) {
+        while (AwaitRequest(&connection) && Serve(connection) && MayGoOn()) {
         }
     }
 
   private:
+    // False when there is nothing more to do here.
+    bool AwaitRequest(int* connection);
+    // As if ordered: kServe with a client, kCome when the next is the master's matter.
+    ControlMessage AwaitClient(int* connection);
     bool Take(int* connection) const;
     bool SayIdle() const;
-    bool AwaitConnection(int* connection) const;
+    ControlMessage ReceiveOrder(int* connection) const;
 
     void TakeConnection(int connection);
     void TakeRest(int connection) const;
@@ -187,16 +201,50 @@ class Worker {
     Environment environment_;
     long long mostMemory_ = 0;
     Nowhere nowhere_;
+    Arrivals arrivals_;
     ProcessState state_;
 };
 
-// While requests wait, neither this nor the master has to be woken for the next one.
-// The master sees that it was taken when it looks, and helps itself to the connection
-// if that lasts.
-bool Worker::Take(int* connection) const {
-    if (slot_->mayTake == 0) {
-        return false;
+bool Worker::AwaitRequest(int* connection) {
+    ControlMessage order = AwaitClient(connection);
+    if (order == kCome && !SayIdle()) {
+        order = kLeave;
     }
+    while (order == kCome) {
+        order = ReceiveOrder(connection);
+    }
+    return order == kServe;
+}
+
+// While requests follow each other, the master is not needed for the next one: it sees
+// what was taken when it looks, and helps itself to a connection that lasts. Who shows
+// that it waits is called when that ends, so it does so before it looks again whether
+// it may. Whom it was woken for it takes in any case: nobody else was.
+ControlMessage Worker::AwaitClient(int* connection) {
+    if (slot_->mayTake == 0 || !arrivals_.StandInLine()) {
+        return kCome;
+    }
+    ++slot_->turns;
+    if (Take(connection)) {
+        return kServe;
+    }
+    while (slot_->mayTake != 0) {
+        const Arrival arrival = arrivals_.Await();
+        if (arrival == Arrival::kOrder) {
+            const ControlMessage order = ReceiveOrder(connection);
+            if (order != kCome) {
+                return order;
+            }
+        } else if (arrival == Arrival::kClient && Take(connection)) {
+            return kServe;
+        } else if (arrival == Arrival::kNone || errno != EAGAIN) {
+            return kCome;
+        }
+    }
+    return kCome;
+}
+
+bool Worker::Take(int* connection) const {
     *connection = accept4(task_.listener, nullptr, nullptr, SOCK_CLOEXEC);
     if (*connection < 0) {
         return false;
@@ -204,7 +252,7 @@ bool Worker::Take(int* connection) const {
     slot_->answerBegun = 0;
     slot_->takenAt = MillisecondsNow();
     slot_->connection = *connection;
-    ++slot_->takes;
+    ++slot_->turns;
     return true;
 }
 
@@ -213,17 +261,17 @@ bool Worker::SayIdle() const {
     return SendMessage(task_.control, &message, sizeof message, -1, 0);
 }
 
-// False when there is nothing more to do here.
-bool Worker::AwaitConnection(int* connection) const {
+// kLeave where there is none to come.
+ControlMessage Worker::ReceiveOrder(int* connection) const {
     char order = kLeave;
     const ssize_t size = ReceiveMessage(task_.control, &order, sizeof order, connection, 0);
     if (size == sizeof order && order == kServe && *connection >= 0) {
-        return true;
+        return kServe;
     }
     if (size > 0 && *connection >= 0) {
         (void)close(*connection);
     }
-    return false;
+    return size == sizeof order && order == kCome ? kCome : kLeave;
 }
 
 bool Worker::Serve(int connection) {
@@ -352,18 +400,16 @@ bool Worker::IsSlim() {
 }  // namespace
 
 int RunWorker(const WorkerTask& task, const Settings& settings) {
-    static const bool registered = pthread_atfork(nullptr, nullptr, LeaveSocketsInChild) == 0;
+    static const bool registered = pthread_atfork(nullptr, nullptr, CloseInChild) == 0;
     (void)registered;
     try {
         ResetSignals();
         TakeNameOfEntry();
-        taskInChildren = task;
         task.slot->pid = getpid();
         TALO::WebEntry::WatchAnswer(&task.slot->answerBegun);
         Worker(task, settings).Live();
     } catch (const std::exception& trouble) {
         Log(LOG_ERR, std::string("the worker ends: ") + trouble.what());
     }
-    taskInChildren = {-1, -1, nullptr};
     return 0;
 }

@@ -11,9 +11,9 @@ struct WorkerTask {
 };
 
 // The life of a worker, in a process that was just forked off the template: says
-// kIdle, serves what the master hands over and, where it may, who has connected since,
-// and goes on or ends as the descriptions of the called APIs say. The working directory is that of
-// the descriptions already. The exit status of the process.
+// kIdle, serves what the master hands over and, where it may, who connects by itself,
+// and goes on or ends as the descriptions of the called APIs say. The working directory
+// is that of the descriptions already. The exit status of the process.
 int RunWorker(const WorkerTask& task, const Settings& settings);
 
 #endif

@@ -49,6 +49,9 @@ void Workers::Tick(long long now) {
         switch (worker.state) {
             case WorkerState::kBusy:
                 FollowOne(index, now);
+                if (slots_.At(index)->IsWaiting() && !worker.isCalled) {
+                    BeginWatch(worker, now);
+                }
                 if (worker.isTimedOut ||
                     IsPastDeadline(*slots_.At(index), worker.pid, &worker.watch, now)) {
                     EndInTime(index);

@@ -20,6 +20,9 @@ constexpr int kAtOncePerProcessor = 2;
 // Most requests are over by then.
 constexpr long long kFetchAfter = 2;
 
+// Requests follow each other that are no further apart.
+constexpr long long kSuccession = 50;
+
 // A duplicate of another process's; -1 where the system refuses that.
 int DescriptorOf(int process, int number) {
     return static_cast<int>(syscall(SYS_pidfd_getfd, process, number, 0));
@@ -33,10 +36,10 @@ bool IsSocket(int descriptor) {
 
 // Of whom the worker took by itself and still has; -1 when that has changed meanwhile.
 int FetchConnection(int process, const Slot& slot) {
-    const unsigned takes = slot.takes;
+    const unsigned turns = slot.turns;
     const int number = slot.connection;
     const int connection = number > 0 ? DescriptorOf(process, number) : -1;
-    const bool isSame = slot.takes == takes && slot.connection == number;
+    const bool isSame = slot.turns == turns && slot.connection == number;
     if (connection >= 0 && !(isSame && IsSocket(connection))) {
         (void)close(connection);
         return -1;
@@ -73,15 +76,19 @@ bool Workers::HandOverAtOnce(const Waiting& waiting, long long now) {
     for (int index = pool_.ChooseIdle(); index >= 0; index = pool_.ChooseIdle()) {
         PooledWorker& worker = pool_.At(index);
         slots_.Clear(index);
-        slots_.At(index)->mayTake = MayTake(worker) ? 1 : 0;
+        slots_.At(index)->mayTake =
+            mayTake_ && worker.generation == templates_->Generation() ? 1 : 0;
         const char message = kServe;
         if (SendMessage(worker.control, &message, sizeof message, waiting.connection,
                         MSG_DONTWAIT)) {
             worker.connection = waiting.connection;
             worker.returns = waiting.returns;
-            worker.takes = 0;
+            worker.turns = 0;
+            worker.isCalled = false;
             BeginWatch(worker, now);
             pool_.SetState(index, WorkerState::kBusy, now);
+            isQuick_ = now - lastBegun_ < kSuccession;
+            lastBegun_ = now;
             return true;
         }
         // It has just ended.
@@ -105,49 +112,67 @@ bool Workers::MayBegin(long long now) {
     return pool_.MayBegin(now);
 }
 
-void Workers::LetTake(bool may) {
-    if ((may && canFetch_) != mayTake_) {
-        mayTake_ = may && canFetch_;
-        ShowMayTake();
-    }
-}
-
-// Those of a template that was replaced should come to their end.
-bool Workers::MayTake(const PooledWorker& worker) const {
-    return mayTake_ && worker.generation == templates_->Generation();
-}
-
-void Workers::ShowMayTake() {
-    for (int index = 0; index < pool_.Size(); ++index) {
-        if (pool_.At(index).state == WorkerState::kBusy) {
-            slots_.At(index)->mayTake = MayTake(pool_.At(index)) ? 1 : 0;
+void Workers::LetTake(bool isWanted, long long now) {
+    mayTake_ = isWanted && canFetch_ && isQuick_ && now - lastBegun_ < kSuccession;
+    for (int index = 0; index < pool_.Size() && AreBusy(); ++index) {
+        if (pool_.At(index).state != WorkerState::kBusy) {
+            continue;
+        }
+        const bool may = MayTake(index, now);
+        Slot& slot = *slots_.At(index);
+        if ((slot.mayTake != 0) != may) {
+            slot.mayTake = may ? 1 : 0;
+        }
+        PooledWorker& worker = pool_.At(index);
+        worker.isCalled = worker.isCalled && !may;
+        if (!may && slot.IsWaiting()) {
+            Call(worker);
         }
     }
 }
 
-void Workers::Follow(long long now) {
+// Those of a template that was replaced should come to their end. Whose request lasts
+// has given its place to another.
+bool Workers::MayTake(int index, long long now) const {
+    return mayTake_ && pool_.At(index).generation == templates_->Generation() &&
+           (slots_.At(index)->IsWaiting() || pool_.IsNew(index, now));
+}
+
+void Workers::Call(PooledWorker& worker) const {
+    const char message = kCome;
+    worker.isCalled =
+        worker.isCalled || SendMessage(worker.control, &message, sizeof message, -1, MSG_DONTWAIT);
+}
+
+bool Workers::Follow(long long now) {
     if (!mayTake_ && !isBehind_) {
-        return;
+        return false;
     }
     isBehind_ = false;
-    for (int index = 0; index < pool_.Size(); ++index) {
-        if (pool_.At(index).state == WorkerState::kBusy) {
+    bool isNewInLine = false;
+    for (int index = 0; index < pool_.Size() && AreBusy(); ++index) {
+        PooledWorker& worker = pool_.At(index);
+        if (worker.state == WorkerState::kBusy) {
             FollowOne(index, now);
-            isBehind_ = isBehind_ || pool_.At(index).connection < 0;
+            isBehind_ = isBehind_ || (worker.connection < 0 && !slots_.At(index)->IsWaiting());
+            isNewInLine = isNewInLine || (worker.turns != 0 && !worker.isInLine);
+            worker.isInLine = worker.isInLine || worker.turns != 0;
         }
     }
+    return isNewInLine;
 }
 
-// One that has taken another connection is done with the one before.
+// One that has gone on by itself is done with the connection before.
 void Workers::FollowOne(int index, long long now) {
     PooledWorker& worker = pool_.At(index);
     const Slot& slot = *slots_.At(index);
-    const unsigned takes = slot.takes;
-    if (takes != worker.takes) {
+    const unsigned turns = slot.turns;
+    if (turns != worker.turns) {
         LetGoOfConnection(worker, now);
-        worker.takes = takes;
+        worker.turns = turns;
         worker.returns = 0;
         BeginWatch(worker, now);
+        lastBegun_ = std::clamp<long long>(slot.takenAt, lastBegun_, now);
     }
     if (worker.connection < 0 && now - slot.takenAt >= kFetchAfter) {
         worker.connection = FetchConnection(worker.process, slot);
@@ -283,7 +308,6 @@ void Workers::CloseDescriptors(PooledWorker& worker) const {
 
 void Workers::OnReady(int) {
     startNotBefore_ = 0;
-    ShowMayTake();
 }
 
 void Workers::OnStarted(const TemplateReport& report, int process) {

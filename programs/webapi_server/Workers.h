@@ -40,16 +40,17 @@ class Workers : public TemplateEvents {
     // Whether one more request may begin now.
     bool MayBegin(long long now);
 
-    // Whether workers that are done may take who connects by themselves. They never may
-    // where the system does not let the master have their connections.
-    void LetTake(bool may);
+    // Whether workers that are done may take who connects by themselves. They do while
+    // requests follow each other, and never where the system does not let the master
+    // have their connections.
+    void LetTake(bool isWanted, long long now);
 
-    // Sees what they have taken.
-    void Follow(long long now);
+    // Sees what they have taken. True when one has newly stood in line for clients.
+    bool Follow(long long now);
 
-    // Whether one has a connection that the master does not have yet.
-    bool IsBehind() const {
-        return isBehind_;
+    // Whether one may have a connection that the master does not have yet.
+    bool MayBeBehind() const {
+        return isBehind_ || (mayTake_ && AreBusy());
     }
 
     // Starts what is wanted while so many requests wait.
@@ -85,8 +86,8 @@ class Workers : public TemplateEvents {
 
   private:
     bool Start(int generation, long long now);
-    bool MayTake(const PooledWorker& worker) const;
-    void ShowMayTake();
+    bool MayTake(int index, long long now) const;
+    void Call(PooledWorker& worker) const;
     void SeeWhetherToFetch(int process);
     void FollowOne(int index, long long now);
     void LetGoOfConnection(PooledWorker& worker, long long now);
@@ -113,6 +114,8 @@ class Workers : public TemplateEvents {
     Pool pool_;
     bool mayTake_ = false;
     bool isBehind_ = false;
+    long long lastBegun_ = 0;
+    bool isQuick_ = false;  // that one followed another
     bool canFetch_ = false;
     long long startNotBefore_ = 0;
     int startFailures_ = 0;  // in a row

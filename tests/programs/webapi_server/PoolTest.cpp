@@ -64,6 +64,14 @@ TEST_F(PoolTest, TakesAWorkerForNewThatHasGoneOnWithAnotherRequest) {
     EXPECT_TRUE(pool.MayBegin(113));
 }
 
+TEST_F(PoolTest, KnowsWhoHasBegunLately) {
+    Have(1, WorkerState::kBusy, 100);
+    Have(1, WorkerState::kIdle, 100);
+    EXPECT_TRUE(pool.IsNew(0, 104));
+    EXPECT_FALSE(pool.IsNew(0, 105));
+    EXPECT_FALSE(pool.IsNew(1, 104));
+}
+
 TEST_F(PoolTest, FollowsWhatWaitsUpToTheMaximum) {
     Have(1, WorkerState::kBusy);
     EXPECT_EQ(pool.ToStart(kGeneration, 3), 3);

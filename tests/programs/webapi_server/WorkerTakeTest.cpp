@@ -8,6 +8,8 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <filesystem>
+#include <set>
 #include <string>
 #include <thread>
 
@@ -66,15 +68,39 @@ class WorkerTake : public support::WorkerLife {
         return poll(&input, 1, 0) == 1;
     }
 
-    // Whether the slot comes to show such a descriptor.
-    bool Shows(bool (*isSuch)(int number)) const {
+    // Whether the slot comes to show something.
+    template <typename Condition>
+    static bool Shows(Condition condition) {
         for (int waited = 0; waited < support::kPatience; ++waited) {
-            if (isSuch(slot_->connection)) {
+            if (condition()) {
                 return true;
             }
             (void)usleep(1000);
         }
         return false;
+    }
+    bool Waits() const {
+        return Shows([this] { return slot_->IsWaiting(); });
+    }
+    bool IsSilent() const {
+        struct pollfd input = {control_, POLLIN, 0};
+        return poll(&input, 1, 0) == 0;
+    }
+    void Order(ControlMessage order) const {
+        const char message = order;
+        EXPECT_TRUE(SendMessage(control_, &message, sizeof message, -1, 0));
+    }
+
+    // A worker that waits for clients.
+    void StartWaiting() {
+        StartTaking();
+        EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
+        ASSERT_TRUE(Waits());
+    }
+    void Serves(const std::string& text) const {
+        const int client = Ask("echo&text=" + text);
+        EXPECT_EQ(text, Body(ReadAll(client))["data"]["text"].asString());
+        (void)close(client);
     }
 
     void OutlivesTheWorker(int connection, int client) {
@@ -94,6 +120,16 @@ class WorkerTake : public support::WorkerLife {
         const int connection = static_cast<int>(syscall(SYS_pidfd_getfd, process, number, 0));
         (void)close(process);
         return connection;
+    }
+
+    // What a process has open.
+    static std::set<std::string> Opened(pid_t process) {
+        std::set<std::string> targets;
+        const auto folder = "/proc/" + std::to_string(process) + "/fd";
+        for (const auto& entry : std::filesystem::directory_iterator(folder)) {
+            targets.insert(std::filesystem::read_symlink(entry.path()).string());
+        }
+        return targets;
     }
 
   private:
@@ -116,10 +152,10 @@ TEST_F(WorkerTake, TakesWhoHasConnectedSinceAndCountsThem) {
     EXPECT_EQ("first", Body(ReadAll(first))["data"]["text"].asString());
     EXPECT_EQ("second", Body(ReadAll(second))["data"]["text"].asString());
     EXPECT_FALSE(HasClients());
-    ASSERT_TRUE(SaysIdle());
+    ASSERT_TRUE(Waits());
     EXPECT_GT(slot_->takenAt, 0);
-    EXPECT_EQ(2U, slot_->takes);
-    EXPECT_EQ(0, slot_->connection) << "it has none any more";
+    EXPECT_EQ(5U, slot_->turns) << "done three times, two taken";
+    EXPECT_TRUE(IsSilent());
     (void)close(first);
     (void)close(second);
 }
@@ -129,7 +165,7 @@ TEST_F(WorkerTake, ShowsTheConnectionThatItTook) {
     const int client = ConnectToListener();
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
     Send(client, BlockOf("wait").substr(0, 9));
-    ASSERT_TRUE(Shows([](int number) { return number > STDERR_FILENO; }));
+    ASSERT_TRUE(Shows([this] { return slot_->connection > STDERR_FILENO; }));
     OutlivesTheWorker(Fetched(), client);
 }
 
@@ -137,7 +173,7 @@ TEST_F(WorkerTake, ShowsTheConnectionWhereItLiesWhileAMethodRuns) {
     StartTaking();
     const int client = Ask("wait");
     EXPECT_TRUE(Body(Call("echo"))["success"].asBool());
-    ASSERT_TRUE(Shows([](int number) { return number == STDOUT_FILENO; }));
+    ASSERT_TRUE(Shows([this] { return slot_->connection == STDOUT_FILENO; }));
     OutlivesTheWorker(Fetched(), client);
 }
 
@@ -150,8 +186,7 @@ TEST_F(WorkerTake, AnswersWhoSendsNoRequestAndTakesTheRestOfIt) {
     EXPECT_NE(std::string::npos, ReadAll(client).find("Status: 400"));
     sender.join();
     (void)close(client);
-    ASSERT_TRUE(SaysIdle());
-    EXPECT_EQ(0, slot_->connection);
+    EXPECT_TRUE(Waits());
 }
 
 TEST_F(WorkerTake, AnswersACrashOfWhatItTookByItself) {
@@ -161,6 +196,69 @@ TEST_F(WorkerTake, AnswersACrashOfWhatItTookByItself) {
     EXPECT_LT(1000, Ended());
     EXPECT_EQ(117, Body(ReadAll(client))["error"]["code"].asInt());
     (void)close(client);
+}
+
+TEST_F(WorkerTake, WaitsForTheNextByItself) {
+    StartWaiting();
+    Serves("later");
+    ASSERT_TRUE(Waits());
+    EXPECT_EQ(3U, slot_->turns);
+    Serves("still later");
+    EXPECT_TRUE(IsSilent());
+}
+
+TEST_F(WorkerTake, ComesWhenCalled) {
+    StartWaiting();
+    slot_->mayTake = 0;
+    Order(kCome);
+    ASSERT_TRUE(SaysIdle());
+    const int client = Ask("echo");
+    EXPECT_EQ("led", Body(Call("echo", "text=led"))["data"]["text"].asString());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(HasClients());
+    (void)close(client);
+}
+
+TEST_F(WorkerTake, StaysWhenItMayAgainBeforeItCame) {
+    StartWaiting();
+    Order(kCome);
+    Serves("one");
+    EXPECT_TRUE(IsSilent());
+}
+
+TEST_F(WorkerTake, ComesOnceForACallThatCameTooLate) {
+    StartWaiting();
+    slot_->mayTake = 0;
+    Order(kCome);
+    ASSERT_TRUE(SaysIdle());
+    Order(kCome);
+    EXPECT_EQ("led", Body(Call("echo", "text=led"))["data"]["text"].asString());
+    ASSERT_TRUE(SaysIdle());
+    EXPECT_TRUE(IsSilent());
+}
+
+TEST_F(WorkerTake, TakesWhomItWasWokenForThoughItMayNotAnyMore) {
+    StartWaiting();
+    ASSERT_EQ(0, kill(worker_, SIGSTOP));
+    ASSERT_EQ(worker_, waitpid(worker_, nullptr, WUNTRACED));
+    slot_->mayTake = 0;
+    const int client = Ask("echo&text=woken");
+    ASSERT_EQ(0, kill(worker_, SIGCONT));
+    EXPECT_EQ("woken", Body(ReadAll(client))["data"]["text"].asString());
+    ASSERT_TRUE(SaysIdle());
+    (void)close(client);
+}
+
+TEST_F(WorkerTake, LeavesWhenToldWhileItWaits) {
+    StartWaiting();
+    Order(kLeave);
+    EXPECT_EQ(0, Ended());
+}
+
+TEST_F(WorkerTake, LeavesWithTheMasterWhileItWaits) {
+    StartWaiting();
+    (void)shutdown(control_, SHUT_RDWR);
+    EXPECT_EQ(0, Ended());
 }
 
 TEST_F(WorkerTake, LeavesClientsToTheMasterUnlessItMayTakeThem) {
@@ -183,15 +281,18 @@ TEST_F(WorkerTake, TakesNobodyWhenItsRequestWasItsLast) {
 }
 
 // The socket is closed for clients when nobody accepts any more.
-TEST_F(WorkerTake, LeavesTheListenerToNoChildOfAMethod) {
+TEST_F(WorkerTake, LeavesNoneOfItsSocketsToAChildOfAMethod) {
     Listen();
     Start();
+    const std::set<std::string> own = Opened(worker_);
     const int child = Body(Call("child"))["data"].asInt();
     ASSERT_GT(child, 0);
     ASSERT_TRUE(SaysIdle());
-    const std::string number = std::to_string(listener_);
-    char target[64] = {};
-    EXPECT_EQ(-1, readlink(("/proc/" + std::to_string(child) + "/fd/" + number).c_str(), target,
-                           sizeof target));
+    const std::set<std::string> ofChild = Opened(child);
+    EXPECT_EQ(1U, own.count("anon_inode:[eventpoll]"));
+    for (const std::string& target : own) {
+        const bool isSocket = target.rfind("socket:", 0) == 0 || target.rfind("anon_", 0) == 0;
+        EXPECT_FALSE(isSocket && ofChild.count(target) != 0) << target;
+    }
     EXPECT_EQ(0, kill(child, SIGKILL));
 }
