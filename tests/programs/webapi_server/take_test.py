@@ -112,7 +112,7 @@ class Taken(scgi_server.ServerTest):
     def test_leaves_workers_in_line_that_others_keep_from_work(self):
         """They have no request for longer than one may hesitate to begin one."""
         server = self.start("--min-workers", "4", "--max-workers", "4",
-                            "--worker-requests", str(MANY))
+                            "--worker-requests", str(MANY), "--worker-growth", str(1 << 20))
         self.echo()
         with self.load():
             time.sleep(0.5)
