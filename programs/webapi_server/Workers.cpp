@@ -34,12 +34,12 @@ bool IsSocket(int descriptor) {
     return getsockopt(descriptor, SOL_SOCKET, SO_TYPE, &type, &size) == 0;
 }
 
-// Of whom the worker took by itself and still has; -1 when that has changed meanwhile.
-int FetchConnection(int process, const Slot& slot) {
-    const unsigned turns = slot.turns;
+// Of whom the worker took at this turn and still has; -1 when that has changed
+// meanwhile: a later one's would pass for done with at the next look.
+int FetchConnection(const PooledWorker& worker, const Slot& slot) {
     const int number = slot.connection;
-    const int connection = number > 0 ? DescriptorOf(process, number) : -1;
-    const bool isSame = slot.turns == turns && slot.connection == number;
+    const int connection = number > 0 ? DescriptorOf(worker.process, number) : -1;
+    const bool isSame = slot.connection == number && slot.turns == worker.turns;
     if (connection >= 0 && !(isSame && IsSocket(connection))) {
         (void)close(connection);
         return -1;
@@ -175,7 +175,7 @@ void Workers::FollowOne(int index, long long now) {
         lastBegun_ = std::clamp<long long>(slot.takenAt, lastBegun_, now);
     }
     if (worker.connection < 0 && now - slot.takenAt >= kFetchAfter) {
-        worker.connection = FetchConnection(worker.process, slot);
+        worker.connection = FetchConnection(worker, slot);
     }
 }
 
