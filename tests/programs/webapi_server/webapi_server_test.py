@@ -252,6 +252,8 @@ class Workers(scgi_server.ServerTest):
             server.wait()
             waiting.settimeout(LONG)
             self.assertEqual(waiting.recv(1), b"")
+            # Until then whoever connects would wait for the one that is gone.
+            self.assertTrue(wait_for(lambda: not self.accepts()))
             self.start()
             self.assertTrue(wait_for(self.accepts))
             self.echo()
