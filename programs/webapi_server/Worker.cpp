@@ -2,12 +2,9 @@
 
 #include <errno.h>
 #include <fcntl.h>
-#include <poll.h>
 #include <pthread.h>
 #include <signal.h>
-#include <stdlib.h>
 #include <string.h>
-#include <sys/ioctl.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
 #include <syslog.h>
@@ -30,6 +27,7 @@
 #include "programs/webapi_server/Clock.h"
 #include "programs/webapi_server/Environment.h"
 #include "programs/webapi_server/Message.h"
+#include "programs/webapi_server/RequestBody.h"
 #include "programs/webapi_server/Restore.h"
 #include "programs/webapi_server/Scgi.h"
 #include "programs/webapi_server/WarmEntry.h"
@@ -83,39 +81,6 @@ void ResetSignals() {
 
 void SendAll(int connection, const ErrorReply& reply) {
     (void)send(connection, reply.text, reply.size, MSG_NOSIGNAL | MSG_DONTWAIT);
-}
-
-long long LengthOfBody() {
-    const char* const text = getenv("CONTENT_LENGTH");
-    return strtoll(text != nullptr ? text : "0", nullptr, 10);
-}
-
-// A method may read its input to the end, which a connection that the web server
-// keeps open does not have. Where all of the body is here already, its end is made;
-// a small one that is just coming is waited for.
-void EndInputBehindBody() {
-    constexpr long long kSmall = 64LL * 1024;
-    constexpr int kMostMilliseconds = 1000;
-    const long long length = LengthOfBody();
-    int here = 0;
-    for (int waited = 0; ioctl(STDIN_FILENO, FIONREAD, &here) == 0; ++waited) {
-        if (here >= length) {
-            (void)shutdown(STDIN_FILENO, SHUT_RD);
-            return;
-        }
-        if (length > kSmall || waited == kMostMilliseconds) {
-            return;
-        }
-        (void)usleep(1000);
-    }
-}
-
-// Whether more of the body arrives, from a client that has been refused.
-bool IsBodyStillComing() {
-    constexpr int kMostMilliseconds = 20;
-    struct pollfd input = {STDIN_FILENO, POLLIN, 0};
-    char first = 0;
-    return poll(&input, 1, kMostMilliseconds) > 0 && recv(STDIN_FILENO, &first, 1, MSG_PEEK) > 0;
 }
 
 // Standard input and output while there is no request.
