@@ -130,6 +130,8 @@ void Master::ShareClients() {
     workers_.LetTake(isAccepting_ && queue_.Size() == 0, now_);
 }
 
+// A worker that ends may have been woken for a client just then, and one that comes
+// back may have left one behind: nobody else is woken for these.
 void Master::Handle(const Event& event) {
     switch (event.source) {
         case Source::kListener:

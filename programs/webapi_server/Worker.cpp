@@ -203,7 +203,7 @@ ControlMessage Worker::AwaitClient(int* connection) {
         } else if (arrival == Arrival::kClient && Take(connection)) {
             return kServe;
         } else if (arrival == Arrival::kNone || errno != EAGAIN) {
-            return kCome;
+            return kCome;  // it cannot wait, or not accept: it would be woken again and again
         }
     }
     return kCome;

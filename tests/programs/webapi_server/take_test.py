@@ -1,4 +1,4 @@
-"""webapi-server under load, when workers take who connects by themselves."""
+"""webapi-server while requests follow each other, and workers take who connects by themselves."""
 
 import contextlib
 import os
